@@ -28,4 +28,10 @@ int LoadStringW(HINSTANCE module, UINT, char16_t*, int) noexcept {
   return 0;
 }
 
+bool FindMessageTemplate(HMODULE module, DWORD, LANGID, std::u16string&) {
+  // Modules carry no message tables until the resource loader provides them.
+  SetLastError(module == nullptr ? ERROR_INVALID_HANDLE : ERROR_MR_MID_NOT_FOUND);
+  return false;
+}
+
 }  // namespace Platform
