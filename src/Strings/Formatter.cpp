@@ -70,7 +70,7 @@ void PutPadded(Sink& sink, const Spec& spec, const char16_t* text, size_t length
 void PutWideString(Sink& sink, const Spec& spec, const char16_t* s) {
   if (s == nullptr) s = u"(null)";
   size_t length = 0;
-  while (s[length] != 0 && (spec.precision < 0 || length < static_cast<size_t>(spec.precision))) {
+  while ((spec.precision < 0 || length < static_cast<size_t>(spec.precision)) && s[length] != 0) {
     ++length;
   }
   PutPadded(sink, spec, s, length);
