@@ -144,8 +144,7 @@ OWUTILS_API int AccessViolationFilter(DWORD code, EXCEPTION_POINTERS* pointers, 
 
 #define THROW_AT(e) (e).Throw(OW_WIDE_FILE, __LINE__)
 
-// The expression text is taken by the outer macros, before `expr` is macro-expanded, so that
-// "p != NULL" reads as written rather than as the compiler's expansion of NULL.
+// The expression text is taken where the macro is written, before its macros (NULL...) expand.
 #define OW_CHECK_(expr, text, Class, ...)                                                  \
   do {                                                                                     \
     if (!(expr)) {                                                                         \
