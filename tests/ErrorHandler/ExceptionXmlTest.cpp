@@ -209,8 +209,3 @@ TEST(ExceptionXml, ThrowAndCloneKeepTheRemoteType) {
 
 }  // namespace
 
-// The test programs get no main from the build; weak, so that a folder-wide main wins if added.
-__attribute__((weak)) int main(int argc, char** argv) {
-  ::testing::InitGoogleTest(&argc, argv);
-  return RUN_ALL_TESTS();
-}
