@@ -64,6 +64,10 @@ void Statement::BindBlob(int index, const void* data, size_t size) {
   sqlite3_bind_blob64(m_stmt, index, size == 0 ? &kEmpty : data, size, SQLITE_TRANSIENT);
 }
 
+void Statement::BindUtf8(int index, const std::string& text) {
+  sqlite3_bind_text64(m_stmt, index, text.data(), text.size(), SQLITE_TRANSIENT, SQLITE_UTF8);
+}
+
 int Statement::Step() { return m_stmt == nullptr ? m_rc : sqlite3_step(m_stmt); }
 
 std::int64_t Statement::Int(int column) const { return sqlite3_column_int64(m_stmt, column); }

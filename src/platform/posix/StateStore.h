@@ -44,6 +44,7 @@ class Statement {
   void Bind(int index, std::int64_t value);
   void Bind(int index, const std::u16string& text);
   void BindBlob(int index, const void* data, size_t size);
+  void BindUtf8(int index, const std::string& text);
   // SQLITE_ROW, SQLITE_DONE or an error.
   int Step();
   std::int64_t Int(int column) const;
