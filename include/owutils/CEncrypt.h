@@ -114,6 +114,10 @@ class OWUTILS_API CEncrypt {
  private:
   void Init();
   BOOL DeriveKey();
+  std::unique_ptr<BlockTransformation> MakeCipher(bool encrypt) const;
+  // The cipher objects, keyed on first use; null for an instance without a cipher.
+  BlockTransformation* Encryptor();
+  BlockTransformation* Decryptor();
   BOOL ProcessFile(const CString& strFile, bool encrypt);
   void CloseDigestFile() noexcept;
 

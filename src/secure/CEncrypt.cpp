@@ -125,19 +125,7 @@ void CEncrypt::Init() {
     ASSERTION(m_pKey != nullptr);
   }
 
-  const BYTE* key = m_pKey.get();
   switch (m_nType) {
-    case ENC_BLOWFISH:
-    case ENC_BLOWFISH_2: {
-      const unsigned int length = m_bReducedStrength ? (m_nType == ENC_BLOWFISH ? 4u : 7u) : 56u;
-      m_pEncryptPtr = std::make_unique<BlowfishEncryption>(key, length);
-      m_pDecryptPtr = std::make_unique<BlowfishDecryption>(key, length);
-      break;
-    }
-    case ENC_TRIPLE_DES:
-      m_pEncryptPtr = std::make_unique<TripleDES_Encryption>(key);
-      m_pDecryptPtr = std::make_unique<TripleDES_Decryption>(key);
-      break;
     case ENC_DES:
     case ENC_DES_2:
       if (m_bReducedStrength) {
@@ -147,41 +135,8 @@ void CEncrypt::Init() {
           m_pKey[6] = 0;
         }
         m_pKey[7] = 0;
-        m_pEncryptPtr = std::make_unique<DESEncryption>(key);
-        m_pDecryptPtr = std::make_unique<DESDecryption>(key);
-      } else {
-        m_pEncryptPtr = std::make_unique<DES_EDE_Encryption>(key);
-        m_pDecryptPtr = std::make_unique<DES_EDE_Decryption>(key);
       }
       break;
-    case ENC_SAFER_SK:
-      m_pEncryptPtr = std::make_unique<SAFER_SK128_Encryption>(key, key + 8, kSafer128Rounds);
-      m_pDecryptPtr = std::make_unique<SAFER_SK128_Decryption>(key, key + 8, kSafer128Rounds);
-      break;
-    case ENC_IDEA:
-      m_pEncryptPtr = std::make_unique<IDEAEncryption>(key);
-      m_pDecryptPtr = std::make_unique<IDEADecryption>(key);
-      break;
-    case ENC_RC5:
-      m_pEncryptPtr = std::make_unique<RC5Encryption>(key, kRC5KeyBytes, kRC5Rounds);
-      m_pDecryptPtr = std::make_unique<RC5Decryption>(key, kRC5KeyBytes, kRC5Rounds);
-      break;
-    case ENC_TWOFISH:
-      m_pEncryptPtr = std::make_unique<TwofishEncryption>(key, 16);
-      m_pDecryptPtr = std::make_unique<TwofishDecryption>(key, 16);
-      break;
-    case ENC_MARS:
-      m_pEncryptPtr = std::make_unique<MARSEncryption>(key, 16);
-      m_pDecryptPtr = std::make_unique<MARSDecryption>(key, 16);
-      break;
-    case ENC_AES_128:
-    case ENC_AES_192:
-    case ENC_AES_256: {
-      const unsigned int length = m_nType == ENC_AES_128 ? 16u : m_nType == ENC_AES_192 ? 24u : 32u;
-      m_pEncryptPtr = std::make_unique<AES_Encryption>(key, length);
-      m_pDecryptPtr = std::make_unique<AES_Decryption>(key, length);
-      break;
-    }
     case DIGEST_SHA1:
       m_pSHA = std::make_unique<SHA160>();
       ResetDigest();
@@ -201,6 +156,66 @@ void CEncrypt::Init() {
     default:
       break;
   }
+}
+
+// The cipher objects are keyed on first use: a caller that only decrypts (the secret-key check)
+// never pays for the encryption key schedule, which for Blowfish and RC5 costs more than the
+// decryption itself.
+std::unique_ptr<BlockTransformation> CEncrypt::MakeCipher(bool encrypt) const {
+  const BYTE* key = m_pKey.get();
+  switch (m_nType) {
+    case ENC_BLOWFISH:
+    case ENC_BLOWFISH_2: {
+      const unsigned int length = m_bReducedStrength ? (m_nType == ENC_BLOWFISH ? 4u : 7u) : 56u;
+      if (encrypt) return std::make_unique<BlowfishEncryption>(key, length);
+      return std::make_unique<BlowfishDecryption>(key, length);
+    }
+    case ENC_TRIPLE_DES:
+      if (encrypt) return std::make_unique<TripleDES_Encryption>(key);
+      return std::make_unique<TripleDES_Decryption>(key);
+    case ENC_DES:
+    case ENC_DES_2:
+      if (m_bReducedStrength) {
+        if (encrypt) return std::make_unique<DESEncryption>(key);
+        return std::make_unique<DESDecryption>(key);
+      }
+      if (encrypt) return std::make_unique<DES_EDE_Encryption>(key);
+      return std::make_unique<DES_EDE_Decryption>(key);
+    case ENC_SAFER_SK:
+      if (encrypt) return std::make_unique<SAFER_SK128_Encryption>(key, key + 8, kSafer128Rounds);
+      return std::make_unique<SAFER_SK128_Decryption>(key, key + 8, kSafer128Rounds);
+    case ENC_IDEA:
+      if (encrypt) return std::make_unique<IDEAEncryption>(key);
+      return std::make_unique<IDEADecryption>(key);
+    case ENC_RC5:
+      if (encrypt) return std::make_unique<RC5Encryption>(key, kRC5KeyBytes, kRC5Rounds);
+      return std::make_unique<RC5Decryption>(key, kRC5KeyBytes, kRC5Rounds);
+    case ENC_TWOFISH:
+      if (encrypt) return std::make_unique<TwofishEncryption>(key, 16);
+      return std::make_unique<TwofishDecryption>(key, 16);
+    case ENC_MARS:
+      if (encrypt) return std::make_unique<MARSEncryption>(key, 16);
+      return std::make_unique<MARSDecryption>(key, 16);
+    case ENC_AES_128:
+    case ENC_AES_192:
+    case ENC_AES_256: {
+      const unsigned int length = m_nType == ENC_AES_128 ? 16u : m_nType == ENC_AES_192 ? 24u : 32u;
+      if (encrypt) return std::make_unique<AES_Encryption>(key, length);
+      return std::make_unique<AES_Decryption>(key, length);
+    }
+    default:
+      return nullptr;
+  }
+}
+
+BlockTransformation* CEncrypt::Encryptor() {
+  if (!m_pEncryptPtr && m_bUsingEncr && m_pKey) m_pEncryptPtr = MakeCipher(true);
+  return m_pEncryptPtr.get();
+}
+
+BlockTransformation* CEncrypt::Decryptor() {
+  if (!m_pDecryptPtr && m_bUsingEncr && m_pKey) m_pDecryptPtr = MakeCipher(false);
+  return m_pDecryptPtr.get();
 }
 
 // The key is D0 || D1 || D2 ... cut to the key length, where D0 is the SHA-1 of the key text in
@@ -253,8 +268,8 @@ BOOL CEncrypt::Encrypt(BYTE* data, int nLength) {
   PRECONDITION(data != NULL && nLength > 0);
   ASSERTION(m_bInit == TRUE);
   ASSERTION2(m_bUsingEncr == TRUE && !m_strKey.IsEmpty(), m_bUsingEncr, !m_strKey.IsEmpty());
-  const unsigned int size = m_pEncryptPtr->BlockSize();
-  m_pEncryptPtr->ProcessBlocks(data, static_cast<size_t>(nLength) / size);
+  BlockTransformation* cipher = Encryptor();
+  cipher->ProcessBlocks(data, static_cast<size_t>(nLength) / cipher->BlockSize());
   return TRUE;
 }
 
@@ -262,12 +277,13 @@ BOOL CEncrypt::Decrypt(BYTE* data, int nLength) {
   PRECONDITION(data != NULL && nLength > 0);
   ASSERTION(m_bInit == TRUE);
   ASSERTION2(m_bUsingEncr == TRUE && !m_strKey.IsEmpty(), m_bUsingEncr, !m_strKey.IsEmpty());
-  const unsigned int size = m_pDecryptPtr->BlockSize();
-  m_pDecryptPtr->ProcessBlocks(data, static_cast<size_t>(nLength) / size);
+  BlockTransformation* cipher = Decryptor();
+  cipher->ProcessBlocks(data, static_cast<size_t>(nLength) / cipher->BlockSize());
   return TRUE;
 }
 
 unsigned int CEncrypt::GetBlockSize() {
+  Decryptor();
   ASSERTION(m_pDecryptPtr.get() != NULL);
   return m_pDecryptPtr->BlockSize();
 }
@@ -287,14 +303,15 @@ CString CEncrypt::EncryptString(const CString& cstrString) {
 
   std::string utf8 = secure::StrictUtf8(cstrString.GetString(), static_cast<size_t>(cstrString.GetLength()));
   const size_t n = utf8.size();
-  const size_t block = m_pEncryptPtr->BlockSize();
+  BlockTransformation* cipher = Encryptor();
+  const size_t block = cipher->BlockSize();
   const size_t blocks = n / block + (n % block != 0 ? 1 : 0);
   const size_t total = (blocks == 0 ? 1 : blocks) * block;
 
   SecureBuffer buffer(total + 1);
   std::memcpy(buffer.get(), utf8.data(), n);
   secure::Wipe(utf8.data(), utf8.size());
-  m_pEncryptPtr->ProcessBlocks(buffer.get(), total / block);
+  cipher->ProcessBlocks(buffer.get(), total / block);
 
   std::string hex(2 * total + 1, '\0');
   HexEncode(buffer.get(), static_cast<int>(total), hex.data());
@@ -309,14 +326,15 @@ CString CEncrypt::DecryptString(const CString& strString) {
 
   const std::string hex = secure::StrictUtf8(strString.GetString(), static_cast<size_t>(strString.GetLength()));
   const size_t h = hex.size();
-  const size_t block = m_pDecryptPtr->BlockSize();
+  BlockTransformation* cipher = Decryptor();
+  const size_t block = cipher->BlockSize();
   const size_t q = (h / 2) / block;
   const size_t total = (2 * q * block < h) ? (q + 1) * block : q * block;
 
   // (h + 1) / 2 decoded bytes and a zero byte always fit in total + 1.
   SecureBuffer buffer(total + 1);
   HexDecode(hex.c_str(), static_cast<int>(h), buffer.get());
-  m_pDecryptPtr->ProcessBlocks(buffer.get(), total / block);
+  cipher->ProcessBlocks(buffer.get(), total / block);
   buffer.get()[total] = 0;
   return secure::WideFromUtf8(buffer.chars());
 }
