@@ -1,16 +1,15 @@
 #include "secure/BlockTransformation.h"
 
 #include <crypto++/aes.h>
-#include <crypto++/algparam.h>
-#include <crypto++/argnames.h>
 #include <crypto++/blowfish.h>
 #include <crypto++/des.h>
 #include <crypto++/idea.h>
 #include <crypto++/mars.h>
-#include <crypto++/rc5.h>
+#include <crypto++/misc.h>
 #include <crypto++/safer.h>
 #include <crypto++/twofish.h>
 
+#include <bit>
 #include <cstring>
 
 // ---- BlockTransformation ----------------------------------------------------------------------
@@ -53,14 +52,6 @@ std::unique_ptr<CryptoPP::BlockCipher> KeyedRounds(const BYTE* key, size_t lengt
   return std::make_unique<Cipher>(key, length, rounds);
 }
 
-// RC5 keyed through the unchecked set-up: the checked one refuses keys above 255 bytes.
-template <class Cipher>
-std::unique_ptr<CryptoPP::BlockCipher> KeyedRC5(const BYTE* key, unsigned int length, unsigned int rounds) {
-  auto cipher = std::make_unique<Cipher>();
-  cipher->UncheckedSetKey(key, length, CryptoPP::MakeParameters(CryptoPP::Name::Rounds(), static_cast<int>(rounds)));
-  return cipher;
-}
-
 // SAFER SK-128 from its two 64-bit key halves.
 template <class Cipher>
 std::unique_ptr<CryptoPP::BlockCipher> KeyedSafer(const BYTE* keyA, const BYTE* keyB, unsigned int rounds) {
@@ -89,7 +80,6 @@ std::unique_ptr<CryptoPP::BlockCipher> KeyedSafer(const BYTE* keyA, const BYTE* 
 OW_DEFINE_BLOCK_ALGORITHM_(Blowfish)
 OW_DEFINE_BLOCK_ALGORITHM_(DES)
 OW_DEFINE_BLOCK_ALGORITHM_(IDEA)
-OW_DEFINE_BLOCK_ALGORITHM_(RC5Base)
 OW_DEFINE_BLOCK_ALGORITHM_(SAFER)
 OW_DEFINE_BLOCK_ALGORITHM_(Twofish)
 OW_DEFINE_BLOCK_ALGORITHM_(MARS)
@@ -106,9 +96,100 @@ IDEAEncryption::IDEAEncryption(const BYTE* key) : IDEA(Keyed<CryptoPP::IDEA::Enc
 IDEADecryption::IDEADecryption(const BYTE* key) : IDEA(Keyed<CryptoPP::IDEA::Decryption>(key, 16)) {}
 
 RC5Encryption::RC5Encryption(const BYTE* key, unsigned int keyLength, unsigned int rounds)
-    : RC5Base(KeyedRC5<CryptoPP::RC5::Encryption>(key, keyLength, rounds)) {}
+    : RC5Base(key, keyLength, rounds, true) {}
 RC5Decryption::RC5Decryption(const BYTE* key, unsigned int keyLength, unsigned int rounds)
-    : RC5Base(KeyedRC5<CryptoPP::RC5::Decryption>(key, keyLength, rounds)) {}
+    : RC5Base(key, keyLength, rounds, false) {}
+
+// ---- RC5-32 -----------------------------------------------------------------------------------
+
+namespace {
+
+constexpr std::uint32_t kRC5P32 = 0xB7E15163u;
+constexpr std::uint32_t kRC5Q32 = 0x9E3779B9u;
+constexpr unsigned int kRC5MaxKey = 256;
+
+std::uint32_t LoadLittle(const BYTE* p) noexcept {
+  return static_cast<std::uint32_t>(p[0]) | static_cast<std::uint32_t>(p[1]) << 8 |
+         static_cast<std::uint32_t>(p[2]) << 16 | static_cast<std::uint32_t>(p[3]) << 24;
+}
+
+void StoreLittle(BYTE* p, std::uint32_t v) noexcept {
+  p[0] = static_cast<BYTE>(v);
+  p[1] = static_cast<BYTE>(v >> 8);
+  p[2] = static_cast<BYTE>(v >> 16);
+  p[3] = static_cast<BYTE>(v >> 24);
+}
+
+}  // namespace
+
+RC5Base::RC5Base(const BYTE* key, unsigned int keyLength, unsigned int rounds, bool encrypt)
+    : m_rounds(rounds), m_bEncrypt(encrypt) {
+  if (keyLength > kRC5MaxKey) keyLength = kRC5MaxKey;
+  const unsigned int t = 2 * rounds + 2;
+  m_pTable.reset(new std::uint32_t[t]);
+  std::uint32_t* s = m_pTable.get();
+
+  // Key bytes into little-endian words L, at least one word.
+  const unsigned int c = keyLength == 0 ? 1 : (keyLength + 3) / 4;
+  std::uint32_t l[kRC5MaxKey / 4] = {0};
+  for (unsigned int i = keyLength; i-- > 0;) l[i / 4] = (l[i / 4] << 8) + key[i];
+
+  s[0] = kRC5P32;
+  for (unsigned int i = 1; i < t; ++i) s[i] = s[i - 1] + kRC5Q32;
+
+  std::uint32_t a = 0, b = 0;
+  unsigned int i = 0, j = 0;
+  const unsigned int steps = 3 * (t > c ? t : c);
+  for (unsigned int k = 0; k < steps; ++k) {
+    a = s[i] = std::rotl(s[i] + a + b, 3);
+    b = l[j] = std::rotl(l[j] + a + b, static_cast<int>((a + b) & 31));
+    if (++i == t) i = 0;
+    if (++j == c) j = 0;
+  }
+  CryptoPP::SecureWipeArray(l, kRC5MaxKey / 4);
+}
+
+RC5Base::~RC5Base() { CryptoPP::SecureWipeArray(m_pTable.get(), 2 * m_rounds + 2); }
+
+void RC5Base::EncryptBlock(const BYTE* in, BYTE* out) const noexcept {
+  const std::uint32_t* s = m_pTable.get();
+  std::uint32_t a = LoadLittle(in) + s[0];
+  std::uint32_t b = LoadLittle(in + 4) + s[1];
+  for (unsigned int i = 1; i <= m_rounds; ++i) {
+    a = std::rotl(a ^ b, static_cast<int>(b & 31)) + s[2 * i];
+    b = std::rotl(b ^ a, static_cast<int>(a & 31)) + s[2 * i + 1];
+  }
+  StoreLittle(out, a);
+  StoreLittle(out + 4, b);
+}
+
+void RC5Base::DecryptBlock(const BYTE* in, BYTE* out) const noexcept {
+  const std::uint32_t* s = m_pTable.get();
+  std::uint32_t a = LoadLittle(in);
+  std::uint32_t b = LoadLittle(in + 4);
+  for (unsigned int i = m_rounds; i >= 1; --i) {
+    b = std::rotr(b - s[2 * i + 1], static_cast<int>(a & 31)) ^ a;
+    a = std::rotr(a - s[2 * i], static_cast<int>(b & 31)) ^ b;
+  }
+  StoreLittle(out, a - s[0]);
+  StoreLittle(out + 4, b - s[1]);
+}
+
+void RC5Base::ProcessBlock(const BYTE* in, BYTE* out) const {
+  if (m_bEncrypt) {
+    EncryptBlock(in, out);
+  } else {
+    DecryptBlock(in, out);
+  }
+}
+
+void RC5Base::ProcessBlock(BYTE* inout) const { ProcessBlock(inout, inout); }
+
+unsigned int RC5Base::BlockSize() const { return 8; }
+
+void RC5Base::ProcessBlocks(BYTE* data, size_t count) const {
+  for (size_t n = 0; n < count; ++n) ProcessBlock(data + 8 * n, data + 8 * n);
+}
 
 SAFER_SK128_Encryption::SAFER_SK128_Encryption(const BYTE* keyA, const BYTE* keyB, unsigned int rounds)
     : SAFER(KeyedSafer<CryptoPP::SAFER_SK::Encryption>(keyA, keyB, rounds)) {}
