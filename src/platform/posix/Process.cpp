@@ -167,39 +167,7 @@ std::vector<std::u16string> SplitCommandLine(const char16_t* p) {
 
 // --- Modules ----------------------------------------------------------------------------------
 
-DWORD GetModuleFileNameW(HMODULE module, char16_t* buffer, DWORD size) noexcept {
-  if (Check("GetModuleFileName")) return 0;
-  std::string native;
-  if (module != nullptr) {
-    struct link_map* map = nullptr;
-    if (::dlinfo(reinterpret_cast<void*>(module), RTLD_DI_LINKMAP, &map) != 0 || map == nullptr) {
-      SetLastError(ERROR_MOD_NOT_FOUND);
-      return 0;
-    }
-    if (map->l_name != nullptr) native = map->l_name;
-  }
-  if (native.empty()) native = ProgramFile();  // the main program has no name in its link map
-  if (native.empty()) {
-    SetLastError(ERROR_MOD_NOT_FOUND);
-    return 0;
-  }
-  if (native[0] != '/') native = CurrentNativeDirectory() + "/" + native;
-  std::u16string path = MapFromNative(native);
-  if (buffer == nullptr || size == 0) {
-    SetLastError(ERROR_INSUFFICIENT_BUFFER);
-    return 0;
-  }
-  if (path.size() >= size) {
-    std::memcpy(buffer, path.data(), (size - 1) * sizeof(char16_t));
-    buffer[size - 1] = 0;
-    SetLastError(ERROR_INSUFFICIENT_BUFFER);
-    return size;
-  }
-  std::memcpy(buffer, path.data(), path.size() * sizeof(char16_t));
-  buffer[path.size()] = 0;
-  SetLastError(ERROR_SUCCESS);
-  return static_cast<DWORD>(path.size());
-}
+// GetModuleFileNameW is defined with the other module services, in Modules.cpp.
 
 HMODULE GetModuleHandleFromAddress(const void* address, bool addReference) noexcept {
   Dl_info info;
