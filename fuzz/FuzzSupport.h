@@ -18,7 +18,8 @@ namespace OwFuzz {
 
 // Creates the sandbox once and points OWUTILS_STATE_DIR and OWUTILS_DRIVES into it.
 inline const std::string& Sandbox() {
-  static const std::string dir = [] {
+  // Never destroyed: the exit handler below still needs it.
+  static const std::string* const dir = [] {
     std::string pattern = (std::filesystem::temp_directory_path() / "owfuzz-XXXXXX").string();
     if (mkdtemp(pattern.data()) == nullptr) {
       std::perror("mkdtemp");
@@ -33,9 +34,9 @@ inline const std::string& Sandbox() {
       std::error_code ignored;
       std::filesystem::remove_all(Sandbox(), ignored);
     });
-    return pattern;
+    return new std::string(pattern);
   }();
-  return dir;
+  return *dir;
 }
 
 // UTF-16 units from pairs of bytes (little-endian); an odd last byte is dropped.
