@@ -30,6 +30,8 @@
 #pragma once
 
 #include <cstdarg>
+#include <cstdint>
+#include <string>
 
 #include "owutils/WinTypes.h"
 
@@ -53,5 +55,10 @@ DWORD FormatMessageW(DWORD flags, const void* source, DWORD messageId, DWORD lan
 void* LocalFree(void* memory) noexcept;
 
 DWORD ExpandEnvironmentStringsW(const char16_t* source, char16_t* destination, DWORD size);
+
+// The local time `time` (seconds since 1970-01-01 UTC) as _wctime64_s writes it:
+// "Wed Jan 02 02:03:55 1980\n", with English names whatever the locale. False for a negative
+// time or one the system cannot convert.
+bool CTimeText(std::int64_t time, std::u16string& text);
 
 }  // namespace Platform

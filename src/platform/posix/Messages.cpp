@@ -4,6 +4,8 @@
 #include <unistd.h>
 
 #include <cstdint>
+#include <cstdio>
+#include <ctime>
 #include <cstdlib>
 #include <cstring>
 #include <string>
@@ -362,6 +364,24 @@ DWORD ExpandEnvironmentStringsW(const char16_t* source, char16_t* destination, D
   } catch (const std::bad_alloc&) {
     return Fail(ERROR_NOT_ENOUGH_MEMORY);
   }
+}
+
+bool CTimeText(std::int64_t time, std::u16string& text) {
+  static const char* const kDays[] = {"Sun", "Mon", "Tue", "Wed", "Thu", "Fri", "Sat"};
+  static const char* const kMonths[] = {"Jan", "Feb", "Mar", "Apr", "May", "Jun",
+                                        "Jul", "Aug", "Sep", "Oct", "Nov", "Dec"};
+  if (time < 0) return Fail(ERROR_INVALID_PARAMETER) != 0;
+  const time_t value = static_cast<time_t>(time);
+  struct tm local;
+  if (localtime_r(&value, &local) == nullptr || local.tm_wday < 0 || local.tm_wday > 6 || local.tm_mon < 0 ||
+      local.tm_mon > 11) {
+    return Fail(ERROR_INVALID_PARAMETER) != 0;
+  }
+  char buffer[64];
+  std::snprintf(buffer, sizeof buffer, "%s %s %02d %02d:%02d:%02d %d\n", kDays[local.tm_wday], kMonths[local.tm_mon],
+                local.tm_mday, local.tm_hour, local.tm_min, local.tm_sec, local.tm_year + 1900);
+  text = ToUtf16(buffer);
+  return true;
 }
 
 }  // namespace Platform
