@@ -138,21 +138,22 @@ OWUTILS_API int AccessViolationFilter(DWORD code, EXCEPTION_POINTERS* pointers, 
 
 #define THROW_AT(e) (e).Throw(OW_WIDE_FILE, __LINE__)
 
-#define OW_CHECK_(expr, Class, ...)                                                        \
+// The expression text is taken where the macro is written, before its macros (NULL...) expand.
+#define OW_CHECK_(expr, text, Class, ...)                                                  \
   do {                                                                                     \
     if (!(expr)) {                                                                         \
-      THROW_AT(::LumoException::Class(::Lumo::String(u"" #expr) __VA_OPT__(, ) __VA_ARGS__)); \
+      THROW_AT(::LumoException::Class(::Lumo::String(text) __VA_OPT__(, ) __VA_ARGS__));   \
     }                                                                                      \
   } while (false)
 
 #define OW_VALUE_(v) static_cast<INT_PTR>(v)
 
-#define PRECONDITION(expr) OW_CHECK_(expr, PreconditionFailed0)
-#define PRECONDITION1(expr, v) OW_CHECK_(expr, PreconditionFailed1, OW_VALUE_(v))
-#define PRECONDITION2(expr, a, b) OW_CHECK_(expr, PreconditionFailed2, OW_VALUE_(a), OW_VALUE_(b))
-#define ASSERTION(expr) OW_CHECK_(expr, AssertionFailed0)
-#define ASSERTION1(expr, v) OW_CHECK_(expr, AssertionFailed1, OW_VALUE_(v))
-#define ASSERTION2(expr, a, b) OW_CHECK_(expr, AssertionFailed2, OW_VALUE_(a), OW_VALUE_(b))
+#define PRECONDITION(expr) OW_CHECK_(expr, u"" #expr, PreconditionFailed0)
+#define PRECONDITION1(expr, v) OW_CHECK_(expr, u"" #expr, PreconditionFailed1, OW_VALUE_(v))
+#define PRECONDITION2(expr, a, b) OW_CHECK_(expr, u"" #expr, PreconditionFailed2, OW_VALUE_(a), OW_VALUE_(b))
+#define ASSERTION(expr) OW_CHECK_(expr, u"" #expr, AssertionFailed0)
+#define ASSERTION1(expr, v) OW_CHECK_(expr, u"" #expr, AssertionFailed1, OW_VALUE_(v))
+#define ASSERTION2(expr, a, b) OW_CHECK_(expr, u"" #expr, AssertionFailed2, OW_VALUE_(a), OW_VALUE_(b))
 
 // CHECKPOINT_TRY opens a block and remembers its line. CHECKPOINT_CATCH closes it: a library
 // exception gets a "checkpointed at" entry for the opening line and a "thrown from" entry for
