@@ -240,10 +240,7 @@ char16_t** CommandLineToArgvW(const char16_t* commandLine, int* count) noexcept 
   }
 }
 
-void* LocalFree(void* block) noexcept {
-  std::free(block);
-  return nullptr;
-}
+// LocalFree is defined once, with the message services, in Messages.cpp.
 
 // --- Current directory ------------------------------------------------------------------------
 
