@@ -402,32 +402,36 @@ DWORD TryCopyTree(const CString& source, const CString& destination, const Ident
 }
 
 void CopyTree(const CString& source, const CString& destination, const Identity* destinationRoot) {
-  CString pattern = Paths::Combine(Paths::ToLongPath(source), u"*.*");
-  CreateDirectories(destination);
-  Identity rootIdentity;
-  if (destinationRoot == nullptr && FileSystemInternal::GetIdentity(Paths::ToLongPath(destination), rootIdentity)) {
-    destinationRoot = &rootIdentity;
-  }
-  WIN32_FIND_DATAW data;
-  AutoFindClose find(Platform::FindFirstFileW(pattern, &data));
-  if (!find.IsValid()) THROW_AT(LumoException::Win32Error(u"FindFirstFile"));
-  do {
-    if (IsDots(data.cFileName)) continue;
-    CString sourceItem = Paths::Combine(source, data.cFileName);
-    CString destinationItem = Paths::Combine(destination, data.cFileName);
-    if (IsLink(data.dwFileAttributes)) {
-      if (!CopyLink(Paths::ToLongPath(sourceItem), Paths::ToLongPath(destinationItem))) {
-        THROW_AT(LumoException::Win32ErrorCode(u"CopyFile", static_cast<int>(Platform::GetLastError())));
-      }
-    } else if ((data.dwFileAttributes & FILE_ATTRIBUTE_DIRECTORY) != 0) {
-      if (IsDestinationRoot(Paths::ToLongPath(sourceItem), destinationRoot)) continue;
-      CopyTree(sourceItem, destinationItem, destinationRoot);
-    } else {
-      Files::CopyFile(sourceItem, destinationItem);
+  try {
+    CString pattern = Paths::Combine(Paths::ToLongPath(source), u"*.*");
+    CreateDirectories(destination);
+    Identity rootIdentity;
+    if (destinationRoot == nullptr && FileSystemInternal::GetIdentity(Paths::ToLongPath(destination), rootIdentity)) {
+      destinationRoot = &rootIdentity;
     }
-  } while (Platform::FindNextFileW(find.Get(), &data));
-  DWORD error = Platform::GetLastError();
-  if (error != ERROR_NO_MORE_FILES) THROW_AT(LumoException::Win32ErrorCode(u"FindNextFile", static_cast<int>(error)));
+    WIN32_FIND_DATAW data;
+    AutoFindClose find(Platform::FindFirstFileW(pattern, &data));
+    if (!find.IsValid()) THROW_AT(LumoException::Win32Error(u"FindFirstFile"));
+    do {
+      if (IsDots(data.cFileName)) continue;
+      CString sourceItem = Paths::Combine(source, data.cFileName);
+      CString destinationItem = Paths::Combine(destination, data.cFileName);
+      if (IsLink(data.dwFileAttributes)) {
+        if (!CopyLink(Paths::ToLongPath(sourceItem), Paths::ToLongPath(destinationItem))) {
+          THROW_AT(LumoException::Win32ErrorCode(u"CopyFile", static_cast<int>(Platform::GetLastError())));
+        }
+      } else if ((data.dwFileAttributes & FILE_ATTRIBUTE_DIRECTORY) != 0) {
+        if (IsDestinationRoot(Paths::ToLongPath(sourceItem), destinationRoot)) continue;
+        CopyTree(sourceItem, destinationItem, destinationRoot);
+      } else {
+        Files::CopyFile(sourceItem, destinationItem);
+      }
+    } while (Platform::FindNextFileW(find.Get(), &data));
+    DWORD error = Platform::GetLastError();
+    if (error != ERROR_NO_MORE_FILES) THROW_AT(LumoException::Win32ErrorCode(u"FindNextFile", static_cast<int>(error)));
+  } catch (LumoException::Exception& e) {
+    THROW_AT(UnableToCopyDirectory(source.str(), destination.str(), e));
+  }
 }
 
 }  // namespace
@@ -445,11 +449,8 @@ DWORD TryCopyDirectory(const CString& cstrSourceDirectory, const CString& cstrDe
 void CopyDirectory(const CString& strSourceDirectoryIn, const CString& strDestinationDirectoryIn) {
   PRECONDITION(!strSourceDirectoryIn.IsEmpty());
   PRECONDITION(!strDestinationDirectoryIn.IsEmpty());
-  try {
-    CopyTree(strSourceDirectoryIn, strDestinationDirectoryIn, nullptr);
-  } catch (LumoException::Exception& e) {
-    THROW_AT(UnableToCopyDirectory(strSourceDirectoryIn.str(), strDestinationDirectoryIn.str(), e));
-  }
+  // Every level of the copy wraps what went wrong below it into UnableToCopyDirectory.
+  CopyTree(strSourceDirectoryIn, strDestinationDirectoryIn, nullptr);
 }
 
 namespace {
