@@ -369,63 +369,7 @@ BOOL GetModuleHandleExW(DWORD flags, const void* address, HMODULE* module) noexc
   return TRUE;
 }
 
-DWORD GetModuleFileNameW(HMODULE module, char16_t* buffer, DWORD size) noexcept {
-  try {
-    void* handle = module != nullptr ? LoaderHandle(module) : MainProgram();
-    link_map* map = nullptr;
-    std::string native;
-    if (handle == nullptr || dlinfo(handle, RTLD_DI_LINKMAP, &map) != 0 || map == nullptr) {
-      SetLastError(ERROR_MOD_NOT_FOUND);
-      return 0;
-    }
-    if (map->l_name != nullptr && *map->l_name != 0) {
-      native = map->l_name;
-    } else {
-      char self[4096];
-      ssize_t n = readlink("/proc/self/exe", self, sizeof self - 1);
-      if (n <= 0) {
-        SetLastError(ERROR_MOD_NOT_FOUND);
-        return 0;
-      }
-      native.assign(self, static_cast<size_t>(n));
-    }
-    if (char* resolved = realpath(native.c_str(), nullptr)) {
-      native = resolved;
-      std::free(resolved);
-    }
-    std::string windows;
-    if (!WindowsModulePath(native, windows)) {
-      SetLastError(ERROR_MOD_NOT_FOUND);
-      return 0;
-    }
-    std::u16string path;
-    int n = MultiByteToWideChar(kCodePageUtf8, 0, windows.c_str(), -1, nullptr, 0);
-    if (n <= 0) {
-      SetLastError(ERROR_NO_UNICODE_TRANSLATION);
-      return 0;
-    }
-    path.resize(static_cast<size_t>(n));
-    MultiByteToWideChar(kCodePageUtf8, 0, windows.c_str(), -1, path.data(), n);
-    path.pop_back();
-    if (buffer == nullptr || size == 0) {
-      SetLastError(ERROR_INSUFFICIENT_BUFFER);
-      return 0;
-    }
-    if (path.size() >= size) {
-      std::copy(path.begin(), path.begin() + (size - 1), buffer);
-      buffer[size - 1] = 0;
-      SetLastError(ERROR_INSUFFICIENT_BUFFER);
-      return size;
-    }
-    std::copy(path.begin(), path.end(), buffer);
-    buffer[path.size()] = 0;
-    SetLastError(ERROR_SUCCESS);
-    return static_cast<DWORD>(path.size());
-  } catch (...) {
-    SetLastError(ERROR_NOT_ENOUGH_MEMORY);
-    return 0;
-  }
-}
+// GetModuleFileNameW is defined with the process services, in Process.cpp.
 
 int LoadStringW(HINSTANCE module, UINT id, char16_t* buffer, int bufferSize) noexcept {
   if (buffer == nullptr || bufferSize < 0) {

@@ -168,7 +168,43 @@ std::vector<std::u16string> SplitCommandLine(const char16_t* p) {
 
 // --- Modules ----------------------------------------------------------------------------------
 
-// GetModuleFileNameW is defined with the other module services, in Modules.cpp.
+DWORD GetModuleFileNameW(HMODULE module, char16_t* buffer, DWORD size) noexcept {
+  if (Check("GetModuleFileName")) return 0;
+  std::string native;
+  if (module != nullptr) {
+    // A module handle is the loader's handle (its link map), possibly tagged in its low bits (a
+    // module loaded as data file). Only a handle of a loaded module is looked at.
+    auto* wanted = reinterpret_cast<struct link_map*>(reinterpret_cast<std::uintptr_t>(module) & ~std::uintptr_t{7});
+    struct link_map* map = _r_debug.r_map;
+    while (map != nullptr && map != wanted) map = map->l_next;
+    if (map == nullptr) {
+      SetLastError(ERROR_MOD_NOT_FOUND);
+      return 0;
+    }
+    if (map->l_name != nullptr) native = map->l_name;
+  }
+  if (native.empty()) native = ProgramFile();  // the main program has no name in its link map
+  if (native.empty()) {
+    SetLastError(ERROR_MOD_NOT_FOUND);
+    return 0;
+  }
+  if (native[0] != '/') native = CurrentNativeDirectory() + "/" + native;
+  std::u16string path = MapFromNative(native);
+  if (buffer == nullptr || size == 0) {
+    SetLastError(ERROR_INSUFFICIENT_BUFFER);
+    return 0;
+  }
+  if (path.size() >= size) {
+    std::memcpy(buffer, path.data(), (size - 1) * sizeof(char16_t));
+    buffer[size - 1] = 0;
+    SetLastError(ERROR_INSUFFICIENT_BUFFER);
+    return size;
+  }
+  std::memcpy(buffer, path.data(), path.size() * sizeof(char16_t));
+  buffer[path.size()] = 0;
+  SetLastError(ERROR_SUCCESS);
+  return static_cast<DWORD>(path.size());
+}
 
 HMODULE GetModuleHandleFromAddress(const void* address, bool addReference) noexcept {
   Dl_info info;
