@@ -14,6 +14,8 @@
 # OWResources_<NAME><LANGUAGE>.
 find_package(Python3 REQUIRED COMPONENTS Interpreter)
 
+# The interpreter target is local to this folder; modules may be built from any folder.
+set(OWUTILS_RESOURCE_PYTHON ${Python3_EXECUTABLE} CACHE INTERNAL "")
 set(OWUTILS_RESOURCE_GENERATOR ${CMAKE_CURRENT_LIST_DIR}/owres_gen.py CACHE INTERNAL "")
 set(OWUTILS_RESOURCE_INCLUDE_DIR ${CMAKE_CURRENT_LIST_DIR}/../include CACHE INTERNAL "")
 
@@ -62,7 +64,7 @@ function(owutils_add_resource_module)
   list(APPEND depends ${OWUTILS_RESOURCE_INCLUDE_DIR}/owutils/ResourceModule.h)
 
   add_custom_command(OUTPUT ${generated}
-    COMMAND Python3::Interpreter ${OWUTILS_RESOURCE_GENERATOR} ${args}
+    COMMAND ${OWUTILS_RESOURCE_PYTHON} ${OWUTILS_RESOURCE_GENERATOR} ${args}
     DEPENDS ${depends}
     COMMENT "Generating resource module ${module}"
     VERBATIM)

@@ -137,6 +137,10 @@ bool WindowsModulePath(const std::string& native, std::string& path) {
     start = end + 1;
     if (item.size() < 3 || item[1] != '=') continue;
     std::string target = item.substr(2);
+    if (char* resolved = realpath(target.c_str(), nullptr)) {
+      target = resolved;
+      std::free(resolved);
+    }
     while (target.size() > 1 && target.back() == '/') target.pop_back();
     bool holds = target == "/" ? !native.empty() && native[0] == '/'
                                : native == target || native.rfind(target + "/", 0) == 0;
