@@ -127,6 +127,11 @@ TEST_F(LoaderTest, BothModulesMissingLeavesTheOutputsAlone) {
   EXPECT_FALSE(LoadResourceModule(u"AppRes", &module, name));
   EXPECT_EQ(module, reinterpret_cast<HINSTANCE>(&marker));
   EXPECT_EQ(name, CString(u"unchanged"));
+  // Reported to the event logger with the export's name, as a failure of LoadLibrary.
+  std::u16string all;
+  for (const auto& line : DebugOutput()) all += line;
+  EXPECT_NE(all.find(u"LoadResourceModule"), std::u16string::npos) << OwTest::Narrow(all);
+  EXPECT_NE(all.find(u"LoadLibrary"), std::u16string::npos) << OwTest::Narrow(all);
   EXPECT_FALSE(LoadResourceModule(u"AppRes", nullptr, name));  // no crash on a null output
 }
 

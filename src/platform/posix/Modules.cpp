@@ -5,7 +5,6 @@
 #include <dlfcn.h>
 #include <link.h>
 #include <sys/stat.h>
-#include <unistd.h>
 
 #include <algorithm>
 #include <atomic>
@@ -20,6 +19,7 @@
 
 #include "owutils/ResourceModule.h"
 #include "platform/Errors.h"
+#include "platform/PathMap.h"
 #include "platform/Text.h"
 
 namespace Platform {
@@ -62,96 +62,6 @@ std::string Utf8(const char16_t* text) {
   WideCharToMultiByte(kCodePageUtf8, 0, text, -1, result.data(), n, nullptr, nullptr);
   result.resize(static_cast<size_t>(n - 1));
   return result;
-}
-
-// Turns a module path in Windows syntax into a native one: drops the long-path prefix, maps a
-// drive letter through OWUTILS_DRIVES ("C=/;D=/mnt/data", default C=/) and a UNC path under
-// OWUTILS_UNC_ROOT, and turns backslashes into slashes. A name without directory stays a name,
-// for the system loader to search.
-// TODO(paths): use the file layer's native path mapping once it is shared by the platform layer.
-bool NativeModulePath(const std::string& path, std::string& native) {
-  std::string p = path;
-  bool unc = false;
-  if (p.rfind("\\\\?\\UNC\\", 0) == 0) {
-    p = p.substr(8);
-    unc = true;
-  } else if (p.rfind("\\\\?\\", 0) == 0) {
-    p = p.substr(4);
-  } else if (p.rfind("\\\\", 0) == 0) {
-    p = p.substr(2);
-    unc = true;
-  }
-  std::replace(p.begin(), p.end(), '\\', '/');
-  if (unc) {
-    const char* root = std::getenv("OWUTILS_UNC_ROOT");
-    if (root == nullptr || *root == 0) {
-      SetLastError(ERROR_BAD_NETPATH);
-      return false;
-    }
-    native = std::string(root) + "/" + p;
-    return true;
-  }
-  if (p.size() >= 2 && p[1] == ':' && std::isalpha(static_cast<unsigned char>(p[0]))) {
-    char drive = static_cast<char>(std::toupper(static_cast<unsigned char>(p[0])));
-    std::string target;
-    const char* map = std::getenv("OWUTILS_DRIVES");
-    std::string drives = map != nullptr && *map != 0 ? map : "C=/";
-    size_t start = 0;
-    while (start <= drives.size()) {
-      size_t end = drives.find(';', start);
-      if (end == std::string::npos) end = drives.size();
-      std::string item = drives.substr(start, end - start);
-      if (item.size() >= 2 && item[1] == '=' &&
-          std::toupper(static_cast<unsigned char>(item[0])) == drive) {
-        target = item.substr(2);
-        break;
-      }
-      start = end + 1;
-    }
-    if (target.empty()) {
-      SetLastError(ERROR_PATH_NOT_FOUND);
-      return false;
-    }
-    std::string rest = p.substr(2);
-    while (!rest.empty() && rest.front() == '/') rest.erase(0, 1);
-    while (target.size() > 1 && target.back() == '/') target.pop_back();
-    native = target == "/" ? "/" + rest : target + "/" + rest;
-    return true;
-  }
-  native = p;
-  return true;
-}
-
-// The reverse of NativeModulePath: the drive whose target holds `native` (the longest target
-// wins), then backslashes. False when no drive holds it.
-bool WindowsModulePath(const std::string& native, std::string& path) {
-  const char* map = std::getenv("OWUTILS_DRIVES");
-  std::string drives = map != nullptr && *map != 0 ? map : "C=/";
-  size_t bestLength = 0;
-  bool found = false;
-  size_t start = 0;
-  while (start <= drives.size()) {
-    size_t end = drives.find(';', start);
-    if (end == std::string::npos) end = drives.size();
-    std::string item = drives.substr(start, end - start);
-    start = end + 1;
-    if (item.size() < 3 || item[1] != '=') continue;
-    std::string target = item.substr(2);
-    if (char* resolved = realpath(target.c_str(), nullptr)) {
-      target = resolved;
-      std::free(resolved);
-    }
-    while (target.size() > 1 && target.back() == '/') target.pop_back();
-    bool holds = target == "/" ? !native.empty() && native[0] == '/'
-                               : native == target || native.rfind(target + "/", 0) == 0;
-    if (!holds || (found && target.size() <= bestLength)) continue;
-    std::string rest = target == "/" ? native.substr(1) : native.substr(std::min(native.size(), target.size() + 1));
-    std::replace(rest.begin(), rest.end(), '/', '\\');
-    path = std::string(1, static_cast<char>(std::toupper(static_cast<unsigned char>(item[0])))) + ":\\" + rest;
-    bestLength = target.size();
-    found = true;
-  }
-  return found;
 }
 
 // The resource table of `module`, or null with the last error set.
@@ -202,8 +112,14 @@ HMODULE LoadLibraryExW(const char16_t* path, HANDLE file, DWORD flags) noexcept 
       SetLastError(ERROR_INVALID_PARAMETER);
       return nullptr;
     }
+    // A bare name is left to the system loader's search; anything else maps through the drive map.
     std::string native;
-    if (!NativeModulePath(Utf8(path), native)) return nullptr;
+    std::u16string text(path);
+    if (text.find_first_of(u"\\/:") == std::u16string::npos) {
+      native = Utf8(path);
+    } else if (!MapToNative(path, native)) {
+      return nullptr;
+    }
     if (native.find('/') != std::string::npos) {
       struct stat st;
       if (stat(native.c_str(), &st) != 0) {
@@ -297,7 +213,14 @@ HMODULE GetModuleHandleW(const char16_t* name) noexcept {
   }
   try {
     std::string native;
-    if (*name == 0 || !NativeModulePath(Utf8(name), native)) {
+    std::u16string text(name);
+    if (text.find_first_of(u"\\/:") == std::u16string::npos) {
+      native = Utf8(name);
+    } else if (!MapToNative(name, native)) {
+      SetLastError(ERROR_MOD_NOT_FOUND);
+      return nullptr;
+    }
+    if (native.empty()) {
       SetLastError(ERROR_MOD_NOT_FOUND);
       return nullptr;
     }
@@ -337,97 +260,6 @@ HMODULE GetModuleHandleW(const char16_t* name) noexcept {
   } catch (...) {
     SetLastError(ERROR_NOT_ENOUGH_MEMORY);
     return nullptr;
-  }
-}
-
-BOOL GetModuleHandleExW(DWORD flags, const void* address, HMODULE* module) noexcept {
-  if (module == nullptr) {
-    SetLastError(ERROR_INVALID_PARAMETER);
-    return FALSE;
-  }
-  *module = nullptr;
-  if ((flags & kGetModuleHandleExFromAddress) == 0 || address == nullptr) {
-    SetLastError(ERROR_INVALID_PARAMETER);
-    return FALSE;
-  }
-  Dl_info info;
-  link_map* holder = nullptr;
-  if (dladdr1(address, &info, reinterpret_cast<void**>(&holder), RTLD_DL_LINKMAP) == 0 ||
-      holder == nullptr) {
-    SetLastError(ERROR_MOD_NOT_FOUND);
-    return FALSE;
-  }
-  // The loader's handle of an object is its link map.
-  void* handle = holder;
-  if ((flags & kGetModuleHandleExUnchangedRefcount) == 0 && handle != MainProgram()) {
-    void* again = dlopen(holder->l_name, RTLD_LAZY | RTLD_NOLOAD);
-    if (again == nullptr) {
-      SetLastError(ERROR_MOD_NOT_FOUND);
-      return FALSE;
-    }
-    std::lock_guard<std::mutex> lock(g_modulesMutex);
-    ++References()[again];
-    handle = again;
-  }
-  *module = reinterpret_cast<HMODULE>(handle);
-  return TRUE;
-}
-
-DWORD GetModuleFileNameW(HMODULE module, char16_t* buffer, DWORD size) noexcept {
-  try {
-    void* handle = module != nullptr ? LoaderHandle(module) : MainProgram();
-    link_map* map = nullptr;
-    std::string native;
-    if (handle == nullptr || dlinfo(handle, RTLD_DI_LINKMAP, &map) != 0 || map == nullptr) {
-      SetLastError(ERROR_MOD_NOT_FOUND);
-      return 0;
-    }
-    if (map->l_name != nullptr && *map->l_name != 0) {
-      native = map->l_name;
-    } else {
-      char self[4096];
-      ssize_t n = readlink("/proc/self/exe", self, sizeof self - 1);
-      if (n <= 0) {
-        SetLastError(ERROR_MOD_NOT_FOUND);
-        return 0;
-      }
-      native.assign(self, static_cast<size_t>(n));
-    }
-    if (char* resolved = realpath(native.c_str(), nullptr)) {
-      native = resolved;
-      std::free(resolved);
-    }
-    std::string windows;
-    if (!WindowsModulePath(native, windows)) {
-      SetLastError(ERROR_MOD_NOT_FOUND);
-      return 0;
-    }
-    std::u16string path;
-    int n = MultiByteToWideChar(kCodePageUtf8, 0, windows.c_str(), -1, nullptr, 0);
-    if (n <= 0) {
-      SetLastError(ERROR_NO_UNICODE_TRANSLATION);
-      return 0;
-    }
-    path.resize(static_cast<size_t>(n));
-    MultiByteToWideChar(kCodePageUtf8, 0, windows.c_str(), -1, path.data(), n);
-    path.pop_back();
-    if (buffer == nullptr || size == 0) {
-      SetLastError(ERROR_INSUFFICIENT_BUFFER);
-      return 0;
-    }
-    if (path.size() >= size) {
-      std::copy(path.begin(), path.begin() + (size - 1), buffer);
-      buffer[size - 1] = 0;
-      SetLastError(ERROR_INSUFFICIENT_BUFFER);
-      return size;
-    }
-    std::copy(path.begin(), path.end(), buffer);
-    buffer[path.size()] = 0;
-    SetLastError(ERROR_SUCCESS);
-    return static_cast<DWORD>(path.size());
-  } catch (...) {
-    SetLastError(ERROR_NOT_ENOUGH_MEMORY);
-    return 0;
   }
 }
 
