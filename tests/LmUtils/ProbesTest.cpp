@@ -254,12 +254,4 @@ TEST_F(IsWow64Test, FailureIsReportedAndAnswersZero) {
   EXPECT_NE(text.find("IsWow64Process"), std::string::npos) << text;
 }
 
-TEST(IsQRWApp, OnlyKindTwo) {
-  EXPECT_TRUE(IsQRWApp(2));
-  EXPECT_FALSE(IsQRWApp(0));
-  EXPECT_FALSE(IsQRWApp(1));
-  EXPECT_FALSE(IsQRWApp(3));
-  EXPECT_FALSE(IsQRWApp(-2));
-}
-
 }  // namespace
