@@ -6,11 +6,9 @@
 
 namespace {
 
-class CrashReportingWithoutComponent : public CrashTest::Fixture {};
-
 using CrashTest::CapturedOutput;
 
-TEST_F(CrashReportingWithoutComponent, InitReportsWhyTheModuleCouldNotBeLoaded) {
+TEST(CrashReportingWithoutComponent, InitReportsWhyTheModuleCouldNotBeLoaded) {
   CapturedOutput output;
   EXPECT_FALSE(LmCrashReportingInit(u"App", u"http://r.example/x", nullptr, 7, true));
   EXPECT_EQ(output.Count("crInstall failure: unable to load module 'CrashRpt1403.so', error = 0x8007007E"), 1u)
@@ -20,7 +18,7 @@ TEST_F(CrashReportingWithoutComponent, InitReportsWhyTheModuleCouldNotBeLoaded) 
   EXPECT_EQ(output.Count("crInstall failure: unable to load module"), 2u);
 }
 
-TEST_F(CrashReportingWithoutComponent, OtherCallsDoNothingAndNeverCrash) {
+TEST(CrashReportingWithoutComponent, OtherCallsDoNothingAndNeverCrash) {
   CapturedOutput output;
   LmCrashReportingAddFile(u"C:\\logs\\agent.log", u"agent log");
   EXPECT_FALSE(LmCrashReportingAddProperty(u"user", u"alice"));

@@ -8,12 +8,10 @@
 
 namespace {
 
-class CrashReportingInit : public CrashTest::Fixture {};
-
 using CrashTest::ComponentLog;
 using CrashTest::Field;
 
-TEST_F(CrashReportingInit, ReportAddressCarriesOemNameAndVersion) {
+TEST(CrashReportingInit, ReportAddressCarriesOemNameAndVersion) {
   ComponentLog log;
   ASSERT_TRUE(LmCrashReportingInit(u"App", u"https://reports.example/receive", nullptr, 7, true));
   const auto lines = log.Lines();
@@ -22,7 +20,7 @@ TEST_F(CrashReportingInit, ReportAddressCarriesOemNameAndVersion) {
   EXPECT_EQ(Field(lines[0], "url"), "https://reports.example/receive?cn=Acme%20%26%20Sons%3DOEM&maj=5&min=2&bld=1234");
 }
 
-TEST_F(CrashReportingInit, WithoutTheEngineModuleTheVersionFallsBack) {
+TEST(CrashReportingInit, WithoutTheEngineModuleTheVersionFallsBack) {
   // The modules are looked for in an empty folder instead.
   LmUtils::detail::ResetResourceStateForTesting();
   LmUtils::detail::SetResourceDirectoryForTesting(CString(u"C:\\"));

@@ -6,12 +6,10 @@
 
 namespace {
 
-class CrashReportingWithPartialComponent : public CrashTest::Fixture {};
-
 using CrashTest::CapturedOutput;
 using CrashTest::ComponentLog;
 
-TEST_F(CrashReportingWithPartialComponent, IsRefusedWholeInsteadOfFailingLater) {
+TEST(CrashReportingWithPartialComponent, IsRefusedWholeInsteadOfFailingLater) {
   ComponentLog log;
   CapturedOutput output;
   EXPECT_FALSE(LmCrashReportingInit(u"App", u"http://r.example/x", nullptr, 7, true));

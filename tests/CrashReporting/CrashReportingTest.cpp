@@ -8,10 +8,6 @@
 
 namespace {
 
-class CrashReportingAddFile : public CrashTest::Fixture {};
-class CrashReportingAddProperty : public CrashTest::Fixture {};
-class CrashReportingInit : public CrashTest::Fixture {};
-
 using CrashTest::CapturedOutput;
 using CrashTest::ComponentLog;
 using CrashTest::Field;
@@ -20,7 +16,7 @@ bool EndsWith(const std::string& text, const std::string& end) {
   return text.size() >= end.size() && text.compare(text.size() - end.size(), end.size(), end) == 0;
 }
 
-TEST_F(CrashReportingInit, InstallsWithDefaultVersionWithoutEngine) {
+TEST(CrashReportingInit, InstallsWithDefaultVersionWithoutEngine) {
   ComponentLog log;
   CapturedOutput output;
   ASSERT_TRUE(LmCrashReportingInit(u"Backup Agent", u"https://reports.example/receive", &CrashTest::TestCallback,
@@ -46,7 +42,7 @@ TEST_F(CrashReportingInit, InstallsWithDefaultVersionWithoutEngine) {
   EXPECT_EQ(output.Count("crInstall failure"), 0u) << output.Text();
 }
 
-TEST_F(CrashReportingInit, NonInteractiveSendsWithoutGui) {
+TEST(CrashReportingInit, NonInteractiveSendsWithoutGui) {
   ComponentLog log;
   ASSERT_TRUE(LmCrashReportingInit(u"Service", u"http://r.example/x", nullptr, 7, false));
   const auto lines = log.Lines();
@@ -55,7 +51,7 @@ TEST_F(CrashReportingInit, NonInteractiveSendsWithoutGui) {
   EXPECT_EQ(Field(lines[0], "callback"), "null");
 }
 
-TEST_F(CrashReportingInit, LanguageFileFollowsTheUserInterfaceLanguage) {
+TEST(CrashReportingInit, LanguageFileFollowsTheUserInterfaceLanguage) {
   ComponentLog log;
   setenv("LC_ALL", "ja_JP.UTF-8", 1);
   const bool installed = LmCrashReportingInit(u"App", u"http://r.example/x", nullptr, 7, true);
@@ -66,7 +62,7 @@ TEST_F(CrashReportingInit, LanguageFileFollowsTheUserInterfaceLanguage) {
   EXPECT_TRUE(EndsWith(Field(lines[0], "lang"), "\\present\\crashrpt_lang_jpn.ini")) << lines[0];
 }
 
-TEST_F(CrashReportingInit, ComponentRefusalIsReportedWithItsText) {
+TEST(CrashReportingInit, ComponentRefusalIsReportedWithItsText) {
   ComponentLog log;
   CapturedOutput output;
   setenv("OWTEST_CRASHRPT_INSTALL_RESULT", "1", 1);
@@ -78,7 +74,7 @@ TEST_F(CrashReportingInit, ComponentRefusalIsReportedWithItsText) {
   EXPECT_EQ(output.Count("crInstall failure: Invalid parameter: pszUrl"), 1u) << output.Text();
 }
 
-TEST_F(CrashReportingAddProperty, FailureIsReportedOnceAndLaterCallsWork) {
+TEST(CrashReportingAddProperty, FailureIsReportedOnceAndLaterCallsWork) {
   ComponentLog log;
   ASSERT_TRUE(LmCrashReportingInit(u"App", u"http://r.example/x", nullptr, 7, true));
   CapturedOutput output;
@@ -95,7 +91,7 @@ TEST_F(CrashReportingAddProperty, FailureIsReportedOnceAndLaterCallsWork) {
   EXPECT_EQ(lines[2], "crAddPropertyW name=user value=alice");
 }
 
-TEST_F(CrashReportingAddFile, PassesFileAndDescription) {
+TEST(CrashReportingAddFile, PassesFileAndDescription) {
   ComponentLog log;
   ASSERT_TRUE(LmCrashReportingInit(u"App", u"http://r.example/x", nullptr, 7, true));
   LmCrashReportingAddFile(u"C:\\logs\\agent.log", u"agent log");

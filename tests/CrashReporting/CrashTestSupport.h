@@ -81,19 +81,4 @@ inline std::string Field(const std::string& line, const std::string& key) {
 
 inline int TestCallback(void*) { return 42; }
 
-// The test programs lie outside the sandbox drive C: the native root is given a letter of its
-// own, as the drive map does for paths no drive holds, so that the library's own directory can
-// be named.
-class Fixture : public ::testing::Test {
- protected:
-  void SetUp() override {
-    const char* map = std::getenv("OWUTILS_DRIVES");
-    std::string drives = map != nullptr ? map : "";
-    if (drives.find("Z=/") == std::string::npos) {
-      drives += drives.empty() ? "Z=/" : ";Z=/";
-      setenv("OWUTILS_DRIVES", drives.c_str(), 1);
-    }
-  }
-};
-
 }  // namespace CrashTest
