@@ -35,12 +35,6 @@ constexpr UINT kStylePlain = 0x1000;        // MB_SYSTEMMODAL
 constexpr int kWrapWidth = 90;
 constexpr int kWrapIndent = 20;
 
-// An assertion whose expression text is given as written (NULL would be expanded by ASSERTION).
-#define OW_ASSERT_AS_WRITTEN(condition, text) \
-  do {                                         \
-    if (!(condition)) THROW_AT(AssertionFailed0(Lumo::String(text))); \
-  } while (false)
-
 const char16_t* const kSourceKeyFormat = u"SYSTEM\\CurrentControlSet\\Services\\EventLog\\%s\\%s";
 
 UINT MessageBoxStyle(WORD type) {
@@ -187,7 +181,7 @@ EventLogger::~EventLogger() {
 }
 
 void EventLogger::Init(int exceptionTargets, int messageTargets, const char16_t* messageFile, int exceptionEventId) {
-  OW_ASSERT_AS_WRITTEN(m_pEventLogger == nullptr, u"m_pEventLogger == NULL");
+  ASSERTION(m_pEventLogger == NULL);
   m_nExceptionTargets = exceptionTargets;
   m_nMessageTargets = messageTargets;
   CHECKPOINT_TRY
@@ -362,8 +356,8 @@ void EventLogger::WrapText(const char16_t* in, char16_t* out, size_t outSize) {
 
 Lumo::String EventLogger::FormatRecord(const char16_t* pEventSrcName, DWORD timeGenerated,
                                        const char16_t* pFormattedText, WORD eventType) {
-  OW_ASSERT_AS_WRITTEN(pEventSrcName != nullptr, u"pEventSrcName != NULL");
-  OW_ASSERT_AS_WRITTEN(pFormattedText != nullptr, u"pFormattedText != NULL");
+  ASSERTION(pEventSrcName != NULL);
+  ASSERTION(pFormattedText != NULL);
   std::u16string time;
   if (!Platform::CTimeText(static_cast<std::int64_t>(timeGenerated), time)) time.clear();
   const size_t end = time.find(u'\n');
@@ -388,10 +382,10 @@ Lumo::String EventLogger::FormatRecord(const char16_t* pEventSrcName, DWORD time
 
 Lumo::String EventLogger::FormatRecordFromInserts(const char16_t* pEventSrcName, DWORD timeGenerated,
                                                   const char16_t* const* pStrings, size_t count, WORD eventType) {
-  OW_ASSERT_AS_WRITTEN(pStrings != nullptr, u"pStrings != NULL");
+  ASSERTION(pStrings != NULL);
   Lumo::String joined;
   for (size_t i = 0; i < count; ++i) {
-    OW_ASSERT_AS_WRITTEN(pStrings[i] != nullptr, u"pStrings[i] != NULL");
+    ASSERTION(pStrings[i] != NULL);
     if (i != 0) joined += u"\n";
     joined += pStrings[i];
   }
