@@ -402,32 +402,36 @@ DWORD TryCopyTree(const CString& source, const CString& destination, const Ident
 }
 
 void CopyTree(const CString& source, const CString& destination, const Identity* destinationRoot) {
-  CString pattern = Paths::Combine(Paths::ToLongPath(source), u"*.*");
-  CreateDirectories(destination);
-  Identity rootIdentity;
-  if (destinationRoot == nullptr && FileSystemInternal::GetIdentity(Paths::ToLongPath(destination), rootIdentity)) {
-    destinationRoot = &rootIdentity;
-  }
-  WIN32_FIND_DATAW data;
-  AutoFindClose find(Platform::FindFirstFileW(pattern, &data));
-  if (!find.IsValid()) THROW_AT(LumoException::Win32Error(u"FindFirstFile"));
-  do {
-    if (IsDots(data.cFileName)) continue;
-    CString sourceItem = Paths::Combine(source, data.cFileName);
-    CString destinationItem = Paths::Combine(destination, data.cFileName);
-    if (IsLink(data.dwFileAttributes)) {
-      if (!CopyLink(Paths::ToLongPath(sourceItem), Paths::ToLongPath(destinationItem))) {
-        THROW_AT(LumoException::Win32ErrorCode(u"CopyFile", static_cast<int>(Platform::GetLastError())));
-      }
-    } else if ((data.dwFileAttributes & FILE_ATTRIBUTE_DIRECTORY) != 0) {
-      if (IsDestinationRoot(Paths::ToLongPath(sourceItem), destinationRoot)) continue;
-      CopyTree(sourceItem, destinationItem, destinationRoot);
-    } else {
-      Files::CopyFile(sourceItem, destinationItem);
+  try {
+    CString pattern = Paths::Combine(Paths::ToLongPath(source), u"*.*");
+    CreateDirectories(destination);
+    Identity rootIdentity;
+    if (destinationRoot == nullptr && FileSystemInternal::GetIdentity(Paths::ToLongPath(destination), rootIdentity)) {
+      destinationRoot = &rootIdentity;
     }
-  } while (Platform::FindNextFileW(find.Get(), &data));
-  DWORD error = Platform::GetLastError();
-  if (error != ERROR_NO_MORE_FILES) THROW_AT(LumoException::Win32ErrorCode(u"FindNextFile", static_cast<int>(error)));
+    WIN32_FIND_DATAW data;
+    AutoFindClose find(Platform::FindFirstFileW(pattern, &data));
+    if (!find.IsValid()) THROW_AT(LumoException::Win32Error(u"FindFirstFile"));
+    do {
+      if (IsDots(data.cFileName)) continue;
+      CString sourceItem = Paths::Combine(source, data.cFileName);
+      CString destinationItem = Paths::Combine(destination, data.cFileName);
+      if (IsLink(data.dwFileAttributes)) {
+        if (!CopyLink(Paths::ToLongPath(sourceItem), Paths::ToLongPath(destinationItem))) {
+          THROW_AT(LumoException::Win32ErrorCode(u"CopyFile", static_cast<int>(Platform::GetLastError())));
+        }
+      } else if ((data.dwFileAttributes & FILE_ATTRIBUTE_DIRECTORY) != 0) {
+        if (IsDestinationRoot(Paths::ToLongPath(sourceItem), destinationRoot)) continue;
+        CopyTree(sourceItem, destinationItem, destinationRoot);
+      } else {
+        Files::CopyFile(sourceItem, destinationItem);
+      }
+    } while (Platform::FindNextFileW(find.Get(), &data));
+    DWORD error = Platform::GetLastError();
+    if (error != ERROR_NO_MORE_FILES) THROW_AT(LumoException::Win32ErrorCode(u"FindNextFile", static_cast<int>(error)));
+  } catch (LumoException::Exception& e) {
+    THROW_AT(UnableToCopyDirectory(source.str(), destination.str(), e));
+  }
 }
 
 }  // namespace
@@ -445,18 +449,20 @@ DWORD TryCopyDirectory(const CString& cstrSourceDirectory, const CString& cstrDe
 void CopyDirectory(const CString& strSourceDirectoryIn, const CString& strDestinationDirectoryIn) {
   PRECONDITION(!strSourceDirectoryIn.IsEmpty());
   PRECONDITION(!strDestinationDirectoryIn.IsEmpty());
-  try {
-    CopyTree(strSourceDirectoryIn, strDestinationDirectoryIn, nullptr);
-  } catch (LumoException::Exception& e) {
-    THROW_AT(UnableToCopyDirectory(strSourceDirectoryIn.str(), strDestinationDirectoryIn.str(), e));
-  }
+  // Every level of the copy wraps what went wrong below it into UnableToCopyDirectory.
+  CopyTree(strSourceDirectoryIn, strDestinationDirectoryIn, nullptr);
 }
 
 namespace {
 
-void Walk(const CString& dir, EnumerateCallback callback, void* context, bool& stop, bool recursive) {
+// The walk of Enumerate. With `namesAndTypes` the find data carries only names and the
+// directory and link attributes, which is all a count needs and spares a query per entry.
+void Walk(const CString& dir, EnumerateCallback callback, void* context, bool& stop, bool recursive,
+          bool namesAndTypes = false) {
   WIN32_FIND_DATAW data;
-  AutoFindClose find(Platform::FindFirstFileW(Paths::Combine(dir, u"*.*"), &data));
+  AutoFindClose find(Platform::FindFirstFileExW(Paths::Combine(dir, u"*.*"),
+                                                namesAndTypes ? Platform::kFindExInfoNamesAndTypes : FindExInfoStandard,
+                                                &data, FindExSearchNameMatch, nullptr, 0));
   if (!find.IsValid()) return;
   do {
     if (stop) return;
@@ -466,7 +472,9 @@ void Walk(const CString& dir, EnumerateCallback callback, void* context, bool& s
       stop = true;
       return;
     }
-    if (recursive && IsTreeDirectory(data.dwFileAttributes)) Walk(path, callback, context, stop, recursive);
+    if (recursive && IsTreeDirectory(data.dwFileAttributes)) {
+      Walk(path, callback, context, stop, recursive, namesAndTypes);
+    }
   } while (Platform::FindNextFileW(find.Get(), &data));
 }
 
@@ -514,8 +522,9 @@ void CountEntries(const CString& strDir, bool recursive, bool& stop, ULONGLONG& 
   directories = 0;
   files = 0;
   Counts counts{&directories, &files};
+  PRECONDITION(!strDir.IsEmpty());
   CHECKPOINT_TRY
-    Enumerate(strDir, &Count, &counts, stop, recursive);
+    Walk(strDir, &Count, &counts, stop, recursive, true);
   CHECKPOINT_CATCH
 }
 
