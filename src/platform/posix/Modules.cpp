@@ -8,11 +8,8 @@
 
 #include <algorithm>
 #include <atomic>
-#include <cctype>
 #include <cerrno>
 #include <cstdint>
-#include <cstdlib>
-#include <cstring>
 #include <mutex>
 #include <string>
 #include <unordered_map>
@@ -64,6 +61,15 @@ std::string Utf8(const char16_t* text) {
   return result;
 }
 
+// Resource tables already found, for modules loaded here (only FreeLibrary can unload those,
+// and it forgets the entry with the last reference).
+std::unordered_map<void*, const OwResourceTable*>& KnownTables() {
+  static std::unordered_map<void*, const OwResourceTable*> tables;
+  return tables;
+}
+
+const OwResourceTable* LookUpResourceTable(void* handle) noexcept;
+
 // The resource table of `module`, or null with the last error set.
 const OwResourceTable* ResourceTable(HMODULE module) noexcept {
   void* handle = LoaderHandle(module);
@@ -72,6 +78,20 @@ const OwResourceTable* ResourceTable(HMODULE module) noexcept {
     SetLastError(ERROR_INVALID_HANDLE);
     return nullptr;
   }
+  try {
+    std::lock_guard<std::mutex> lock(g_modulesMutex);
+    auto known = KnownTables().find(handle);
+    if (known != KnownTables().end()) return known->second;
+    const OwResourceTable* table = LookUpResourceTable(handle);
+    if (table != nullptr && References().count(handle) != 0) KnownTables()[handle] = table;
+    return table;
+  } catch (...) {
+    SetLastError(ERROR_NOT_ENOUGH_MEMORY);
+    return nullptr;
+  }
+}
+
+const OwResourceTable* LookUpResourceTable(void* handle) noexcept {
   dlerror();
   void* symbol = dlsym(handle, OWUTILS_RESOURCE_TABLE_SYMBOL);
   link_map* own = nullptr;
@@ -171,6 +191,7 @@ BOOL FreeLibrary(HMODULE module) noexcept {
     }
     if (--it->second == 0) {
       References().erase(it);
+      KnownTables().erase(handle);
       // The current resource module must not outlive its last reference.
       HINSTANCE current = g_resourceHandle.load();
       if (current != nullptr && LoaderHandle(current) == handle) g_resourceHandle.store(nullptr);
