@@ -11,11 +11,21 @@
 # is the Windows language identifier in lower-case hexadecimal without leading zeros, as the
 # library builds the file name (409 English, 407 German, 804 Simplified Chinese...). The text
 # formats are described in owres_gen.py. The target is called TARGET, by default
-# OWResources_<NAME><LANGUAGE>.
+# OWResources_<NAME><LANGUAGE>. An installed library carries this file and the generator in
+# <prefix>/lib/cmake/OWUtils: include(${OWUtils_DIR}/OWUtilsResources.cmake).
 find_package(Python3 REQUIRED COMPONENTS Interpreter)
 
+# The interpreter target is local to this folder; modules may be built from any folder.
+set(OWUTILS_RESOURCE_PYTHON ${Python3_EXECUTABLE} CACHE INTERNAL "")
 set(OWUTILS_RESOURCE_GENERATOR ${CMAKE_CURRENT_LIST_DIR}/owres_gen.py CACHE INTERNAL "")
-set(OWUTILS_RESOURCE_INCLUDE_DIR ${CMAKE_CURRENT_LIST_DIR}/../include CACHE INTERNAL "")
+# The public headers: beside this file in the source tree, or in the installed include folder.
+if(EXISTS ${CMAKE_CURRENT_LIST_DIR}/../include/owutils/ResourceModule.h)
+  get_filename_component(_owutils_include ${CMAKE_CURRENT_LIST_DIR}/../include ABSOLUTE)
+else()
+  get_filename_component(_owutils_include ${CMAKE_CURRENT_LIST_DIR}/../../../include ABSOLUTE)
+endif()
+set(OWUTILS_RESOURCE_INCLUDE_DIR ${_owutils_include} CACHE INTERNAL "")
+include(GNUInstallDirs)
 
 function(owutils_add_resource_module)
   cmake_parse_arguments(PARSE_ARGV 0 ARG "NO_INSTALL"
@@ -62,7 +72,7 @@ function(owutils_add_resource_module)
   list(APPEND depends ${OWUTILS_RESOURCE_INCLUDE_DIR}/owutils/ResourceModule.h)
 
   add_custom_command(OUTPUT ${generated}
-    COMMAND Python3::Interpreter ${OWUTILS_RESOURCE_GENERATOR} ${args}
+    COMMAND ${OWUTILS_RESOURCE_PYTHON} ${OWUTILS_RESOURCE_GENERATOR} ${args}
     DEPENDS ${depends}
     COMMENT "Generating resource module ${module}"
     VERBATIM)

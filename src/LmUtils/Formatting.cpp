@@ -5,9 +5,8 @@
 
 #include "LmUtils/ResourceState.h"
 #include "owutils/LmResources.h"
-#include "platform/Errors.h"
 #include "platform/Locale.h"
-#include "platform/Modules.h"
+#include "platform/Messages.h"
 
 namespace {
 
@@ -73,12 +72,12 @@ void GetErrorMessage(DWORD code, CString& text) {
   text.Empty();
   if (!LoadMessageResources()) return;
   // The message table of the module first, then the system's texts; inserts stay as written.
-  std::u16string message;
-  if (!Platform::FindMessageTemplate(LmUtils::g_hMessageResources, code, 0, message) &&
-      !Platform::GetSystemMessage(code, message)) {
-    return;
-  }
-  if (message.size() >= kMessageBufferSize) return;  // does not fit the message buffer
+  char16_t buffer[kMessageBufferSize];
+  DWORD length = Platform::FormatMessageW(
+      FORMAT_MESSAGE_FROM_HMODULE | FORMAT_MESSAGE_FROM_SYSTEM | FORMAT_MESSAGE_IGNORE_INSERTS,
+      LmUtils::g_hMessageResources, code, 0, buffer, kMessageBufferSize, nullptr);
+  if (length == 0) return;
+  std::u16string message(buffer, length);
   std::u16string joined;
   joined.reserve(message.size());
   for (char16_t c : message) {

@@ -3,8 +3,9 @@
 
 #include "ErrorHandler/Reporting.h"
 #include "LmUtils/ResourceState.h"
+#include "owutils/Application.h"
 #include "owutils/Exceptions.h"
-#include "platform/Debug.h"
+#include "owutils/Paths.h"
 #include "platform/Locale.h"
 #include "platform/Modules.h"
 #include "platform/Registry.h"
@@ -62,48 +63,10 @@ CString ProductKeyPath() {
   return path;
 }
 
-// ---- Adapters ---------------------------------------------------------------------------
-// TODO(merge): the warning goes to the logger registered as "LM_EVENT_HANDLER" with
-// ReportMessage(2, text) once the event logger's reporting helper is on this branch; until then
-// it goes where the default logger would write it, the debugger output.
-void ReportWarning(const CString& text) {
-  CString line = text;
-  line += u"\n";
-  Platform::OutputDebugStringW(line.GetString());
-}
-
-// TODO(merge): Application::GetModuleLongDirectory(nullptr) once it is on this branch.
-// The directory of this library's own file in long-path form.
-CString LibraryDirectory() {
-  HMODULE self = nullptr;
-  if (!Platform::GetModuleHandleExW(
-          Platform::kGetModuleHandleExFromAddress | Platform::kGetModuleHandleExUnchangedRefcount,
-          reinterpret_cast<const void*>(&GetLanguageId), &self)) {
-    THROW_AT(LumoException::Win32Error(u"GetModuleHandleEx"));
-  }
-  char16_t buffer[4096];
-  DWORD length = Platform::GetModuleFileNameW(self, buffer, 4096);
-  if (length == 0 || length >= 4096) THROW_AT(LumoException::Win32Error(u"GetModuleFileName"));
-  CString path(buffer, static_cast<int>(length));
-  int slash = path.ReverseFind(u'\\');
-  CString directory = slash >= 0 ? path.Left(slash) : path;
-  if (directory.GetLength() == 2 && directory[1] == u':') directory += u"\\";
-  if (directory.Left(4) != CString(u"\\\\?\\")) directory = CString(u"\\\\?\\") + directory;
-  return directory;
-}
-
 // The directory the modules lie in: the directory of this library's own file.
 CString ResourceDirectory() {
   if (!g_strResourceDirectoryOverride.IsEmpty()) return g_strResourceDirectoryOverride;
-  return LibraryDirectory();
-}
-
-// One backslash between directory and name unless the directory already ends with one.
-CString CombinePath(const CString& directory, const CString& name) {
-  CString path = directory;
-  if (path.IsEmpty() || path[path.GetLength() - 1] != u'\\') path += u"\\";
-  path += name;
-  return path;
+  return Application::GetModuleLongDirectory(nullptr);
 }
 
 CString ModuleFileName(const CString& baseName, LANGID language) {
@@ -170,7 +133,7 @@ bool LoadResourceModule(const CString& baseName, HINSTANCE* module, CString& fil
     PRECONDITION(module != NULL);
     CString directory = ResourceDirectory();
     CString name = ModuleFileName(baseName, GetLanguageId());
-    CString path = CombinePath(directory, name);
+    CString path = Paths::Combine(directory, name);
     HINSTANCE loaded = Platform::LoadLibraryW(path.GetString());
     if (loaded != nullptr) {
       *module = loaded;
@@ -180,11 +143,11 @@ bool LoadResourceModule(const CString& baseName, HINSTANCE* module, CString& fil
     if (!g_bResourceFallbackReported) {
       CString text;
       text.Format(u"Unable to load resource file %s, defaulting to English", path.GetString());
-      ReportWarning(text);
+      LumoException::detail::ReportWarningToEventHandler(text.GetString());
       g_bResourceFallbackReported = true;
     }
     name = ModuleFileName(baseName, kEnglish);
-    loaded = Platform::LoadLibraryW(CombinePath(directory, name).GetString());
+    loaded = Platform::LoadLibraryW(Paths::Combine(directory, name).GetString());
     if (loaded != nullptr) {
       *module = loaded;
       fileName = name;

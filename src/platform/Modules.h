@@ -1,6 +1,7 @@
 // Platform service: modules and their resources.
 //
 // A module is a loaded shared object (the main program, the library itself, a resource module).
+// Module file names and the module holding an address are in platform/Process.h.
 // A module handle is the system loader's own handle, so handles from any part of the platform
 // layer mix freely. A module loaded as a data file gets the loader's handle with its lowest bit
 // set, as on Windows: it serves resources but no exports.
@@ -51,23 +52,6 @@ void* GetProcAddress(HMODULE module, const char* name) noexcept;
 // loaded module whose file name (with or without directory) is `name`, without adding a
 // reference; null with ERROR_MOD_NOT_FOUND when there is none.
 HMODULE GetModuleHandleW(const char16_t* name) noexcept;
-
-constexpr DWORD kGetModuleHandleExUnchangedRefcount = 0x2;  // GET_MODULE_HANDLE_EX_FLAG_UNCHANGED_REFCOUNT
-constexpr DWORD kGetModuleHandleExFromAddress = 0x4;       // GET_MODULE_HANDLE_EX_FLAG_FROM_ADDRESS
-
-// GetModuleHandleExW with GET_MODULE_HANDLE_EX_FLAG_FROM_ADDRESS: the module that holds
-// `address` (the main program, the library itself, a loaded module). Without
-// GET_MODULE_HANDLE_EX_FLAG_UNCHANGED_REFCOUNT a reference is taken, for FreeLibrary to drop.
-// Other uses, and an address in no module, fail with ERROR_INVALID_PARAMETER /
-// ERROR_MOD_NOT_FOUND and *module null.
-BOOL GetModuleHandleExW(DWORD flags, const void* address, HMODULE* module) noexcept;
-
-// GetModuleFileNameW: the full path of `module` (null: the main program) in Windows syntax, the
-// native path mapped back through the drive map (C:\usr\lib\libOWUtils.so for C=/).
-// Returns the units written without the terminator; a path that does not fit is cut to size-1
-// units and terminated, and the result is `size` with ERROR_INSUFFICIENT_BUFFER. Fails with 0
-// and ERROR_MOD_NOT_FOUND when the module or no drive holds the path.
-DWORD GetModuleFileNameW(HMODULE module, char16_t* buffer, DWORD size) noexcept;
 
 // LoadStringW: string resource `id` of `module` (a null module means the main program). With
 // `bufferSize` 0, `buffer` receives a read-only pointer to the resource text (not

@@ -102,6 +102,17 @@ TEST(ExceptionXml, RoundTripThreeDeepChainWithNonLatinText) {
   }
 }
 
+TEST(ExceptionXml, MessagesKeepWhitespaceMarkupAndEmptiness) {
+  for (const char16_t* message : {u"  two\r\n\tlines  ", u"", u"a < b && c > \"d\" 'e' ]]> <!-- x -->", u"\U0001F600 \u00e9"}) {
+    LumoException::Exception e(message);
+    e.SetUserMessage(message);
+    RemoteException remote(ToXml(e));
+    EXPECT_EQ(N(remote.GetMessage()), N(message));
+    EXPECT_EQ(N(remote.GetUserMessage()), *message != 0 ? N(message) : "");
+    EXPECT_EQ(std::u16string(remote.GetType().name), u"Exception");
+  }
+}
+
 TEST(ExceptionXml, ReadsRawNonLatinMarkupLookalikes) {
   // Hand-written XML (not from ToXml) with U+013C and U+0126 in values and attributes.
   RemoteException remote(

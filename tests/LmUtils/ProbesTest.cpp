@@ -8,9 +8,18 @@
 #include <sys/socket.h>
 #include <unistd.h>
 
+#include <cstdlib>
+#include <filesystem>
+#include <fstream>
+#include <sstream>
 #include <string>
+#include <utility>
+#include <vector>
 
 #include "owutils/Exceptions.h"
+#include "platform/Debug.h"
+#include "platform/Errors.h"
+#include "platform/Wow64.h"
 #include "support/TestEnvironment.h"
 
 namespace {
@@ -136,12 +145,113 @@ TEST(ParseToDomainAndUser, OutputMayAliasTheInput) {
   EXPECT_EQ(user, String(u"alice"));
 }
 
-TEST(IsQRWApp, OnlyKindTwo) {
-  EXPECT_TRUE(IsQRWApp(2));
-  EXPECT_FALSE(IsQRWApp(0));
-  EXPECT_FALSE(IsQRWApp(1));
-  EXPECT_FALSE(IsQRWApp(3));
-  EXPECT_FALSE(IsQRWApp(-2));
+// The file-system type and mount point of every mount of this process.
+std::vector<std::pair<std::string, std::string>> Mounts() {
+  std::vector<std::pair<std::string, std::string>> mounts;
+  std::ifstream table("/proc/self/mountinfo");
+  for (std::string line; std::getline(table, line);) {
+    std::istringstream fields(line);
+    std::string id, parent, device, root, point, field, type;
+    fields >> id >> parent >> device >> root >> point;
+    while (fields >> field && field != "-") {
+    }
+    if (fields >> type && point.find('\\') == std::string::npos) mounts.emplace_back(type, point);
+  }
+  return mounts;
+}
+
+std::string FsTypeOf(const std::string& mountPoint) {
+  std::string type;
+  for (const auto& [fs, point] : Mounts()) {
+    if (point == mountPoint) type = fs;  // a later mount hides an earlier one
+  }
+  return type;
+}
+
+// Adds drives to the sandbox's drive map for one test.
+class DriveMap {
+ public:
+  explicit DriveMap(const std::string& extra) : m_saved(std::getenv("OWUTILS_DRIVES")) {
+    setenv("OWUTILS_DRIVES", (m_saved + ";" + extra).c_str(), 1);
+  }
+  ~DriveMap() { setenv("OWUTILS_DRIVES", m_saved.c_str(), 1); }
+
+ private:
+  std::string m_saved;
+};
+
+TEST(GetDriveDeviceType, UnmappedOrMissingDrivesAreUnknown) {
+  DriveMap map("M=" + OwTest::SandboxDirectory() + "/no-such-folder");
+  EXPECT_EQ(GetDriveDeviceType(u"Q:\\"), LmDriveUnknown);
+  EXPECT_EQ(GetDriveDeviceType(u"M:\\"), LmDriveUnknown);
+  EXPECT_EQ(GetDriveDeviceType(u""), LmDriveUnknown);
+  EXPECT_EQ(GetDriveDeviceType(u"\\\\noserver\\share\\"), LmDriveUnknown);  // no UNC root configured
+}
+
+TEST(GetDriveDeviceType, RamDiskFromTmpfs) {
+  std::string tmpfs;
+  for (const auto& [fs, point] : Mounts()) {
+    if (fs == "tmpfs" && FsTypeOf(point) == "tmpfs") tmpfs = point;
+  }
+  if (tmpfs.empty()) GTEST_SKIP() << "no tmpfs mount here";
+  DriveMap map("R=" + tmpfs);
+  EXPECT_EQ(GetDriveDeviceType(u"R:\\"), LmDriveRamDisk) << tmpfs;
+  EXPECT_EQ(GetDriveDeviceType(u"r:"), LmDriveRamDisk) << tmpfs;  // only the letter counts
+}
+
+TEST(GetDriveDeviceType, DiskFileSystemsAreFixed) {
+  std::string disk;
+  for (const auto& [fs, point] : Mounts()) {
+    if ((fs == "ext4" || fs == "xfs" || fs == "btrfs" || fs == "overlay") && FsTypeOf(point) == fs) disk = point;
+  }
+  if (disk.empty()) GTEST_SKIP() << "no disk-backed mount here";
+  DriveMap map("F=" + disk);
+  // A removable disk would be classified by its medium; the disks of a build machine are fixed.
+  const LmDriveType type = GetDriveDeviceType(u"F:\\");
+  EXPECT_TRUE(type == LmDriveFixed || type == LmDriveRemovable) << disk << " gave " << type;
+}
+
+TEST(GetDriveDeviceType, UncRootsAreRemote) {
+  const std::string unc = OwTest::MakeTempDirectory("unc");
+  std::filesystem::create_directories(unc + "/server/share");
+  setenv("OWUTILS_UNC_ROOT", unc.c_str(), 1);
+  EXPECT_EQ(GetDriveDeviceType(u"\\\\server\\share\\"), LmDriveRemote);
+  unsetenv("OWUTILS_UNC_ROOT");
+}
+
+// Stand-ins for the system's IsWow64Process.
+BOOL AnswerWow64(HANDLE, BOOL* isWow64) {
+  *isWow64 = TRUE;
+  return TRUE;
+}
+BOOL FailWow64(HANDLE, BOOL*) {
+  Platform::SetLastError(ERROR_ACCESS_DENIED);
+  return FALSE;
+}
+
+class IsWow64Test : public ::testing::Test {
+ protected:
+  void TearDown() override {
+    Platform::ClearKernelFunctionOverrides();
+    Platform::SetOutputHook({});
+  }
+};
+
+TEST_F(IsWow64Test, AnswersOneOrZero) {
+  Platform::SetKernelFunctionOverride("IsWow64Process", nullptr);
+  EXPECT_EQ(IsWow64(), 0);
+  Platform::SetKernelFunctionOverride("IsWow64Process", reinterpret_cast<void*>(&AnswerWow64));
+  EXPECT_EQ(IsWow64(), 1);
+}
+
+TEST_F(IsWow64Test, FailureIsReportedAndAnswersZero) {
+  std::u16string reported;
+  Platform::SetOutputHook([&](const char*, const std::u16string& text) { reported += text; });
+  Platform::SetKernelFunctionOverride("IsWow64Process", reinterpret_cast<void*>(&FailWow64));
+  EXPECT_EQ(IsWow64(), 0);
+  const std::string text = OwTest::Narrow(reported);
+  EXPECT_NE(text.find("IsWow64"), std::string::npos) << text;
+  EXPECT_NE(text.find("IsWow64Process"), std::string::npos) << text;
 }
 
 }  // namespace

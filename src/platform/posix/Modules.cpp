@@ -5,21 +5,18 @@
 #include <dlfcn.h>
 #include <link.h>
 #include <sys/stat.h>
-#include <unistd.h>
 
 #include <algorithm>
 #include <atomic>
-#include <cctype>
 #include <cerrno>
 #include <cstdint>
-#include <cstdlib>
-#include <cstring>
 #include <mutex>
 #include <string>
 #include <unordered_map>
 
 #include "owutils/ResourceModule.h"
 #include "platform/Errors.h"
+#include "platform/PathMap.h"
 #include "platform/Text.h"
 
 namespace Platform {
@@ -64,91 +61,14 @@ std::string Utf8(const char16_t* text) {
   return result;
 }
 
-// Turns a module path in Windows syntax into a native one: drops the long-path prefix, maps a
-// drive letter through OWUTILS_DRIVES ("C=/;D=/mnt/data", default C=/) and a UNC path under
-// OWUTILS_UNC_ROOT, and turns backslashes into slashes. A name without directory stays a name,
-// for the system loader to search.
-// TODO(paths): use the file layer's native path mapping once it is shared by the platform layer.
-bool NativeModulePath(const std::string& path, std::string& native) {
-  std::string p = path;
-  bool unc = false;
-  if (p.rfind("\\\\?\\UNC\\", 0) == 0) {
-    p = p.substr(8);
-    unc = true;
-  } else if (p.rfind("\\\\?\\", 0) == 0) {
-    p = p.substr(4);
-  } else if (p.rfind("\\\\", 0) == 0) {
-    p = p.substr(2);
-    unc = true;
-  }
-  std::replace(p.begin(), p.end(), '\\', '/');
-  if (unc) {
-    const char* root = std::getenv("OWUTILS_UNC_ROOT");
-    if (root == nullptr || *root == 0) {
-      SetLastError(ERROR_BAD_NETPATH);
-      return false;
-    }
-    native = std::string(root) + "/" + p;
-    return true;
-  }
-  if (p.size() >= 2 && p[1] == ':' && std::isalpha(static_cast<unsigned char>(p[0]))) {
-    char drive = static_cast<char>(std::toupper(static_cast<unsigned char>(p[0])));
-    std::string target;
-    const char* map = std::getenv("OWUTILS_DRIVES");
-    std::string drives = map != nullptr && *map != 0 ? map : "C=/";
-    size_t start = 0;
-    while (start <= drives.size()) {
-      size_t end = drives.find(';', start);
-      if (end == std::string::npos) end = drives.size();
-      std::string item = drives.substr(start, end - start);
-      if (item.size() >= 2 && item[1] == '=' &&
-          std::toupper(static_cast<unsigned char>(item[0])) == drive) {
-        target = item.substr(2);
-        break;
-      }
-      start = end + 1;
-    }
-    if (target.empty()) {
-      SetLastError(ERROR_PATH_NOT_FOUND);
-      return false;
-    }
-    std::string rest = p.substr(2);
-    while (!rest.empty() && rest.front() == '/') rest.erase(0, 1);
-    while (target.size() > 1 && target.back() == '/') target.pop_back();
-    native = target == "/" ? "/" + rest : target + "/" + rest;
-    return true;
-  }
-  native = p;
-  return true;
+// Resource tables already found, for modules loaded here (only FreeLibrary can unload those,
+// and it forgets the entry with the last reference).
+std::unordered_map<void*, const OwResourceTable*>& KnownTables() {
+  static std::unordered_map<void*, const OwResourceTable*> tables;
+  return tables;
 }
 
-// The reverse of NativeModulePath: the drive whose target holds `native` (the longest target
-// wins), then backslashes. False when no drive holds it.
-bool WindowsModulePath(const std::string& native, std::string& path) {
-  const char* map = std::getenv("OWUTILS_DRIVES");
-  std::string drives = map != nullptr && *map != 0 ? map : "C=/";
-  size_t bestLength = 0;
-  bool found = false;
-  size_t start = 0;
-  while (start <= drives.size()) {
-    size_t end = drives.find(';', start);
-    if (end == std::string::npos) end = drives.size();
-    std::string item = drives.substr(start, end - start);
-    start = end + 1;
-    if (item.size() < 3 || item[1] != '=') continue;
-    std::string target = item.substr(2);
-    while (target.size() > 1 && target.back() == '/') target.pop_back();
-    bool holds = target == "/" ? !native.empty() && native[0] == '/'
-                               : native == target || native.rfind(target + "/", 0) == 0;
-    if (!holds || (found && target.size() <= bestLength)) continue;
-    std::string rest = target == "/" ? native.substr(1) : native.substr(std::min(native.size(), target.size() + 1));
-    std::replace(rest.begin(), rest.end(), '/', '\\');
-    path = std::string(1, static_cast<char>(std::toupper(static_cast<unsigned char>(item[0])))) + ":\\" + rest;
-    bestLength = target.size();
-    found = true;
-  }
-  return found;
-}
+const OwResourceTable* LookUpResourceTable(void* handle) noexcept;
 
 // The resource table of `module`, or null with the last error set.
 const OwResourceTable* ResourceTable(HMODULE module) noexcept {
@@ -158,6 +78,20 @@ const OwResourceTable* ResourceTable(HMODULE module) noexcept {
     SetLastError(ERROR_INVALID_HANDLE);
     return nullptr;
   }
+  try {
+    std::lock_guard<std::mutex> lock(g_modulesMutex);
+    auto known = KnownTables().find(handle);
+    if (known != KnownTables().end()) return known->second;
+    const OwResourceTable* table = LookUpResourceTable(handle);
+    if (table != nullptr && References().count(handle) != 0) KnownTables()[handle] = table;
+    return table;
+  } catch (...) {
+    SetLastError(ERROR_NOT_ENOUGH_MEMORY);
+    return nullptr;
+  }
+}
+
+const OwResourceTable* LookUpResourceTable(void* handle) noexcept {
   dlerror();
   void* symbol = dlsym(handle, OWUTILS_RESOURCE_TABLE_SYMBOL);
   link_map* own = nullptr;
@@ -198,8 +132,14 @@ HMODULE LoadLibraryExW(const char16_t* path, HANDLE file, DWORD flags) noexcept 
       SetLastError(ERROR_INVALID_PARAMETER);
       return nullptr;
     }
+    // A bare name is left to the system loader's search; anything else maps through the drive map.
     std::string native;
-    if (!NativeModulePath(Utf8(path), native)) return nullptr;
+    std::u16string text(path);
+    if (text.find_first_of(u"\\/:") == std::u16string::npos) {
+      native = Utf8(path);
+    } else if (!MapToNative(path, native)) {
+      return nullptr;
+    }
     if (native.find('/') != std::string::npos) {
       struct stat st;
       if (stat(native.c_str(), &st) != 0) {
@@ -251,6 +191,7 @@ BOOL FreeLibrary(HMODULE module) noexcept {
     }
     if (--it->second == 0) {
       References().erase(it);
+      KnownTables().erase(handle);
       // The current resource module must not outlive its last reference.
       HINSTANCE current = g_resourceHandle.load();
       if (current != nullptr && LoaderHandle(current) == handle) g_resourceHandle.store(nullptr);
@@ -293,7 +234,14 @@ HMODULE GetModuleHandleW(const char16_t* name) noexcept {
   }
   try {
     std::string native;
-    if (*name == 0 || !NativeModulePath(Utf8(name), native)) {
+    std::u16string text(name);
+    if (text.find_first_of(u"\\/:") == std::u16string::npos) {
+      native = Utf8(name);
+    } else if (!MapToNative(name, native)) {
+      SetLastError(ERROR_MOD_NOT_FOUND);
+      return nullptr;
+    }
+    if (native.empty()) {
       SetLastError(ERROR_MOD_NOT_FOUND);
       return nullptr;
     }
@@ -335,41 +283,6 @@ HMODULE GetModuleHandleW(const char16_t* name) noexcept {
     return nullptr;
   }
 }
-
-BOOL GetModuleHandleExW(DWORD flags, const void* address, HMODULE* module) noexcept {
-  if (module == nullptr) {
-    SetLastError(ERROR_INVALID_PARAMETER);
-    return FALSE;
-  }
-  *module = nullptr;
-  if ((flags & kGetModuleHandleExFromAddress) == 0 || address == nullptr) {
-    SetLastError(ERROR_INVALID_PARAMETER);
-    return FALSE;
-  }
-  Dl_info info;
-  link_map* holder = nullptr;
-  if (dladdr1(address, &info, reinterpret_cast<void**>(&holder), RTLD_DL_LINKMAP) == 0 ||
-      holder == nullptr) {
-    SetLastError(ERROR_MOD_NOT_FOUND);
-    return FALSE;
-  }
-  // The loader's handle of an object is its link map.
-  void* handle = holder;
-  if ((flags & kGetModuleHandleExUnchangedRefcount) == 0 && handle != MainProgram()) {
-    void* again = dlopen(holder->l_name, RTLD_LAZY | RTLD_NOLOAD);
-    if (again == nullptr) {
-      SetLastError(ERROR_MOD_NOT_FOUND);
-      return FALSE;
-    }
-    std::lock_guard<std::mutex> lock(g_modulesMutex);
-    ++References()[again];
-    handle = again;
-  }
-  *module = reinterpret_cast<HMODULE>(handle);
-  return TRUE;
-}
-
-// GetModuleFileNameW is defined with the process services, in Process.cpp.
 
 int LoadStringW(HINSTANCE module, UINT id, char16_t* buffer, int bufferSize) noexcept {
   if (buffer == nullptr || bufferSize < 0) {

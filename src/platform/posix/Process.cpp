@@ -10,7 +10,6 @@
 #include <unistd.h>
 
 #include <cerrno>
-#include <cstdint>
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
@@ -172,12 +171,8 @@ DWORD GetModuleFileNameW(HMODULE module, char16_t* buffer, DWORD size) noexcept 
   if (Check("GetModuleFileName")) return 0;
   std::string native;
   if (module != nullptr) {
-    // A module handle is the loader's handle (its link map), possibly tagged in its low bits (a
-    // module loaded as data file). Only a handle of a loaded module is looked at.
-    auto* wanted = reinterpret_cast<struct link_map*>(reinterpret_cast<std::uintptr_t>(module) & ~std::uintptr_t{7});
-    struct link_map* map = _r_debug.r_map;
-    while (map != nullptr && map != wanted) map = map->l_next;
-    if (map == nullptr) {
+    struct link_map* map = nullptr;
+    if (::dlinfo(reinterpret_cast<void*>(module), RTLD_DI_LINKMAP, &map) != 0 || map == nullptr) {
       SetLastError(ERROR_MOD_NOT_FOUND);
       return 0;
     }
@@ -277,7 +272,10 @@ char16_t** CommandLineToArgvW(const char16_t* commandLine, int* count) noexcept 
   }
 }
 
-// LocalFree is defined once, with the message services, in Messages.cpp.
+void* LocalFree(void* block) noexcept {
+  std::free(block);
+  return nullptr;
+}
 
 // --- Current directory ------------------------------------------------------------------------
 
