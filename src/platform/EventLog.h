@@ -19,8 +19,10 @@
 // with ERROR_EVENTLOG_FILE_CORRUPT (1500); an unreadable one with the code of the system error.
 //
 // On POSIX the event log is the SQLite database "eventlog.db" in the state folder
-// (platform/StateDirectory.h), shared by every process of the user. A record is durable once
-// ReportEventW returns; a writer killed in the middle of a write leaves every committed record.
+// (platform/StateDirectory.h), shared by every process of the user. A record is committed when
+// ReportEventW returns: a writer killed at any point leaves every committed record readable. The
+// store reaches the disk at its checkpoints, so a power failure may lose the last records (never
+// the store itself).
 // With OWUTILS_EVENTLOG_SYSLOG=1 each record is also sent to syslog.
 #pragma once
 

@@ -56,7 +56,11 @@ constexpr std::uint32_t kSourceMagic = 0x4F57534F;  // "OWSO"
 constexpr std::uint32_t kLogMagic = 0x4F574C47;     // "OWLG"
 
 StateStore& Store() {
-  static StateStore* store = new StateStore("eventlog.db", kSchema, ERROR_EVENTLOG_FILE_CORRUPT);
+  // A record is in the write-ahead log when ReportEventW returns: a crash of the writing process
+  // loses nothing committed. The log reaches the disk at checkpoints (a sync per record would
+  // cap a service at the disk's few hundred syncs per second).
+  static StateStore* store =
+      new StateStore("eventlog.db", kSchema, ERROR_EVENTLOG_FILE_CORRUPT, StateStore::Sync::Normal);
   return *store;
 }
 

@@ -88,8 +88,8 @@ const void* Statement::Blob(int column, size_t& size) const {
 
 // ---- StateStore -----------------------------------------------------------------------------
 
-StateStore::StateStore(const char* fileName, const char* schema, DWORD corruptError)
-    : m_fileName(fileName), m_schema(schema), m_corruptError(corruptError) {}
+StateStore::StateStore(const char* fileName, const char* schema, DWORD corruptError, Sync sync)
+    : m_fileName(fileName), m_schema(schema), m_corruptError(corruptError), m_sync(sync) {}
 
 StateStore::~StateStore() {
   std::lock_guard<std::recursive_mutex> guard(m_lock);
@@ -181,7 +181,10 @@ DWORD StateStore::Open() {
   if (rc == SQLITE_OK) {
     sqlite3_busy_timeout(db, kBusyTimeoutMs);
     sqlite3_extended_result_codes(db, 0);
-    rc = sqlite3_exec(db, "PRAGMA journal_mode=WAL; PRAGMA synchronous=FULL; PRAGMA foreign_keys=ON;", nullptr, nullptr, nullptr);
+    rc = sqlite3_exec(db,
+                      m_sync == Sync::Full ? "PRAGMA journal_mode=WAL; PRAGMA synchronous=FULL; PRAGMA foreign_keys=ON;"
+                                           : "PRAGMA journal_mode=WAL; PRAGMA synchronous=NORMAL; PRAGMA foreign_keys=ON;",
+                      nullptr, nullptr, nullptr);
   }
   if (rc == SQLITE_OK) rc = sqlite3_exec(db, "BEGIN IMMEDIATE", nullptr, nullptr, nullptr);
   if (rc == SQLITE_OK) {

@@ -4,7 +4,7 @@
 // A StateStore is one database file, shared by every thread of the process through one
 // connection under one lock, and by other processes through SQLite's own locking: the journal is
 // a write-ahead log, a busy peer is waited for (busy timeout), every write is one IMMEDIATE
-// transaction committed with a full sync. A store whose file is corrupt or not a database makes
+// transaction. A store whose file is corrupt or not a database makes
 // the calls fail with the store's corruption code; the connection is then dropped, so that a
 // repaired or replaced file is picked up by the next call.
 #pragma once
@@ -58,9 +58,15 @@ class Statement {
 
 class StateStore {
  public:
+  // How a commit reaches the disk. Full: the write-ahead log is synced at every commit, so a
+  // committed write survives a power failure. Normal: a committed write is in the write-ahead
+  // log (survives a crash of the writing process) and reaches the disk at the next checkpoint;
+  // a power failure may lose the last commits but never damages the store.
+  enum class Sync { Full, Normal };
+
   // `fileName` inside the state folder; `schema` is run once per connection inside a write
   // transaction (CREATE ... IF NOT EXISTS); `corruptError` is the Win32 code for a damaged store.
-  StateStore(const char* fileName, const char* schema, DWORD corruptError);
+  StateStore(const char* fileName, const char* schema, DWORD corruptError, Sync sync = Sync::Full);
   ~StateStore();
 
   using Work = std::function<DWORD(StateStore&)>;
@@ -85,6 +91,7 @@ class StateStore {
   const char* m_fileName;
   const char* m_schema;
   DWORD m_corruptError;
+  Sync m_sync;
   std::recursive_mutex m_lock;
   sqlite3* m_db = nullptr;
   std::string m_path;   // file the connection is open on
