@@ -158,6 +158,8 @@ struct WIN32_FIND_DATAW {
 };
 
 enum GET_FILEEX_INFO_LEVELS { GetFileExInfoStandard = 0, GetFileExMaxInfoLevel = 1 };
+enum FINDEX_INFO_LEVELS { FindExInfoStandard = 0, FindExInfoBasic = 1, FindExInfoMaxInfoLevel = 2 };
+enum FINDEX_SEARCH_OPS { FindExSearchNameMatch = 0, FindExSearchLimitToDirectories = 1 };
 
 struct WIN32_FILE_ATTRIBUTE_DATA {
   DWORD dwFileAttributes;

@@ -147,6 +147,16 @@ BOOL SetFileAttributesW(const char16_t* fileName, DWORD attributes) noexcept;
 // ERROR_FILE_NOT_FOUND, a missing directory with ERROR_PATH_NOT_FOUND.
 HANDLE FindFirstFileW(const char16_t* pattern, WIN32_FIND_DATAW* data) noexcept;
 
+// FindFirstFileExW ("FindFirstFile") with FindExInfoStandard or FindExInfoBasic and
+// FindExSearchNameMatch works as FindFirstFileW. This layer adds the level
+// kFindExInfoNamesAndTypes: only the name and the directory and reparse-point attributes are
+// filled (no sizes, times or read-only flag), as cheaply as the system lists a directory, for
+// walks that only need to tell directories from the rest. Other levels or operations fail with
+// ERROR_INVALID_PARAMETER.
+constexpr int kFindExInfoNamesAndTypes = 0x100;
+HANDLE FindFirstFileExW(const char16_t* pattern, int infoLevel, WIN32_FIND_DATAW* data, int searchOp, void* filter,
+                        DWORD flags) noexcept;
+
 // FindNextFileW ("FindNextFile"): the next entry; FALSE with ERROR_NO_MORE_FILES (18) at the end.
 // An entry removed since the search started is skipped.
 BOOL FindNextFileW(HANDLE find, WIN32_FIND_DATAW* data) noexcept;

@@ -191,30 +191,34 @@ bool CopyData(int from, int to) {
   }
 }
 
-BOOL CopyNative(const std::string& from, const std::string& to, bool failIfExists, bool copyLink) {
-  struct stat source;
-  if (::lstat(from.c_str(), &source) != 0) {
-    SetPathError(errno, from);
+BOOL CopyLinkNative(const std::string& from, const std::string& to, bool failIfExists, const struct stat& source) {
+  std::vector<char> target(static_cast<size_t>(source.st_size > 0 ? source.st_size : 255) + 1);
+  ssize_t n = ::readlink(from.c_str(), target.data(), target.size() - 1);
+  if (n < 0) return FailErrno(errno);
+  target[static_cast<size_t>(n)] = 0;
+  if (!failIfExists) {
+    struct stat existing;
+    if (::lstat(to.c_str(), &existing) == 0) {
+      if (S_ISDIR(existing.st_mode)) return Fail(ERROR_ACCESS_DENIED);
+      ::unlink(to.c_str());
+    }
+  }
+  if (::symlink(target.data(), to.c_str()) != 0) {
+    if (errno == EEXIST) return Fail(ERROR_FILE_EXISTS);
+    SetPathError(errno, to);
     return FALSE;
   }
-  if (S_ISLNK(source.st_mode) && copyLink) {
-    std::vector<char> target(static_cast<size_t>(source.st_size > 0 ? source.st_size : 255) + 1);
-    ssize_t n = ::readlink(from.c_str(), target.data(), target.size() - 1);
-    if (n < 0) return FailErrno(errno);
-    target[static_cast<size_t>(n)] = 0;
-    if (!failIfExists) {
-      struct stat existing;
-      if (::lstat(to.c_str(), &existing) == 0) {
-        if (S_ISDIR(existing.st_mode)) return Fail(ERROR_ACCESS_DENIED);
-        ::unlink(to.c_str());
-      }
-    }
-    if (::symlink(target.data(), to.c_str()) != 0) {
-      if (errno == EEXIST) return Fail(ERROR_FILE_EXISTS);
-      SetPathError(errno, to);
+  return TRUE;
+}
+
+BOOL CopyNative(const std::string& from, const std::string& to, bool failIfExists, bool copyLink) {
+  if (copyLink) {
+    struct stat source;
+    if (::lstat(from.c_str(), &source) != 0) {
+      SetPathError(errno, from);
       return FALSE;
     }
-    return TRUE;
+    if (S_ISLNK(source.st_mode)) return CopyLinkNative(from, to, failIfExists, source);
   }
   int in = ::open(from.c_str(), O_RDONLY | O_CLOEXEC);
   if (in < 0) {
@@ -224,20 +228,25 @@ BOOL CopyNative(const std::string& from, const std::string& to, bool failIfExist
   struct stat st;
   if (::fstat(in, &st) != 0 || S_ISDIR(st.st_mode)) {
     int error = errno;
+    bool directory = S_ISDIR(st.st_mode);
     ::close(in);
-    return S_ISDIR(st.st_mode) ? Fail(ERROR_ACCESS_DENIED) : FailErrno(error);
+    return directory ? Fail(ERROR_ACCESS_DENIED) : FailErrno(error);
   }
   mode_t mode = st.st_mode & 07777;
-  struct stat existing;
-  if (::lstat(to.c_str(), &existing) == 0 && !S_ISDIR(existing.st_mode) && (existing.st_mode & S_IWUSR) == 0 &&
-      !failIfExists) {
-    // A read-only destination is not overwritten, whatever rights the caller has.
-    ::close(in);
-    return Fail(ERROR_ACCESS_DENIED);
+  // A new destination is created exclusively; an existing one is opened without truncation
+  // first, for it may be the source under another name, or read-only.
+  bool created = true;
+  int out = ::open(to.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, mode | S_IWUSR);
+  if (out < 0 && errno == EEXIST && !failIfExists) {
+    created = false;
+    struct stat existing;
+    if (::lstat(to.c_str(), &existing) == 0 && !S_ISDIR(existing.st_mode) && (existing.st_mode & S_IWUSR) == 0) {
+      // A read-only destination is not overwritten, whatever rights the caller has.
+      ::close(in);
+      return Fail(ERROR_ACCESS_DENIED);
+    }
+    out = ::open(to.c_str(), O_WRONLY | O_CLOEXEC);
   }
-  // The destination is opened without truncation first: it may be the source under another name.
-  int flags = O_WRONLY | O_CREAT | O_CLOEXEC | (failIfExists ? O_EXCL : 0);
-  int out = ::open(to.c_str(), flags, mode | S_IWUSR);
   if (out < 0) {
     int error = errno;
     ::close(in);
@@ -247,16 +256,22 @@ BOOL CopyNative(const std::string& from, const std::string& to, bool failIfExist
     return FALSE;
   }
   struct stat dst;
-  if (::fstat(out, &dst) == 0 && dst.st_dev == st.st_dev && dst.st_ino == st.st_ino) {
-    ::close(out);
-    ::close(in);
-    return Fail(ERROR_SHARING_VIOLATION);
+  bool ok = true;
+  if (!created) {
+    if (::fstat(out, &dst) == 0 && dst.st_dev == st.st_dev && dst.st_ino == st.st_ino) {
+      ::close(out);
+      ::close(in);
+      return Fail(ERROR_SHARING_VIOLATION);
+    }
+    ok = ::ftruncate(out, 0) == 0;
   }
-  bool ok = ::ftruncate(out, 0) == 0 && CopyData(in, out);
+  ok = ok && CopyData(in, out);
   int error = errno;
   if (ok) {
     struct timespec times[2] = {st.st_atim, st.st_mtim};
     ::futimens(out, times);
+    // Created with the owner's write permission added and the umask taken away: the source's
+    // permissions (and so its read-only attribute) are set last.
     ::fchmod(out, mode);
   }
   if (::close(out) != 0 && ok) {
@@ -326,6 +341,8 @@ class FindObject : public HandleObject {
   std::string m_directory;  // native, for single-entry searches
   DIR* m_dir = nullptr;
   std::vector<std::string> m_names;
+  std::vector<unsigned char> m_types;  // d_type of each name, for the names-and-types level
+  bool m_namesAndTypes = false;
   size_t m_next = 0;
 };
 
@@ -353,10 +370,36 @@ void FillFindData(const std::string& name, const struct stat& st, bool linkToDir
   std::memcpy(data->cFileName, wide.data(), n * sizeof(char16_t));
 }
 
+void FillNameAndType(const std::string& name, DWORD attributes, WIN32_FIND_DATAW* data) {
+  std::memset(data, 0, sizeof *data);
+  data->dwFileAttributes = attributes;
+  std::u16string wide = Posix::ToUtf16(name);
+  size_t n = std::min(wide.size(), static_cast<size_t>(MAX_PATH - 1));
+  std::memcpy(data->cFileName, wide.data(), n * sizeof(char16_t));
+}
+
 // Delivers the next entry that still exists.
 bool NextEntry(FindObject* find, WIN32_FIND_DATAW* data) {
   while (find->m_next < find->m_names.size()) {
-    const std::string& name = find->m_names[find->m_next++];
+    size_t index = find->m_next++;
+    const std::string& name = find->m_names[index];
+    if (find->m_namesAndTypes && find->m_dir != nullptr && index < find->m_types.size()) {
+      unsigned char type = find->m_types[index];
+      if (type == DT_DIR) {
+        FillNameAndType(name, FILE_ATTRIBUTE_DIRECTORY, data);
+        return true;
+      }
+      if (type == DT_LNK) {
+        struct stat target;
+        bool toDirectory = ::fstatat(::dirfd(find->m_dir), name.c_str(), &target, 0) == 0 && S_ISDIR(target.st_mode);
+        FillNameAndType(name, FILE_ATTRIBUTE_REPARSE_POINT | (toDirectory ? FILE_ATTRIBUTE_DIRECTORY : 0u), data);
+        return true;
+      }
+      if (type != DT_UNKNOWN) {
+        FillNameAndType(name, FILE_ATTRIBUTE_NORMAL, data);
+        return true;
+      }
+    }
     struct stat st;
     int rc = find->m_dir != nullptr ? ::fstatat(::dirfd(find->m_dir), name.c_str(), &st, AT_SYMLINK_NOFOLLOW)
                                     : ::lstat((find->m_directory + "/" + name).c_str(), &st);
@@ -761,8 +804,9 @@ BOOL SetFileAttributesW(const char16_t* fileName, DWORD attributes) noexcept {
 
 // --- Searching --------------------------------------------------------------------------------
 
-HANDLE FindFirstFileW(const char16_t* pattern, WIN32_FIND_DATAW* data) noexcept {
-  if (Check("FindFirstFile")) return INVALID_HANDLE_VALUE;
+namespace {
+
+HANDLE FindFirst(const char16_t* pattern, WIN32_FIND_DATAW* data, bool namesAndTypes) {
   if (data == nullptr) {
     SetLastError(ERROR_INVALID_PARAMETER);
     return INVALID_HANDLE_VALUE;
@@ -783,6 +827,7 @@ HANDLE FindFirstFileW(const char16_t* pattern, WIN32_FIND_DATAW* data) noexcept 
     return INVALID_HANDLE_VALUE;
   }
   find->m_directory = directory;
+  find->m_namesAndTypes = namesAndTypes;
   if (!HasWildcards(wildcard)) {
     // One name: no need to read the directory.
     find->m_names.push_back(last);
@@ -795,13 +840,19 @@ HANDLE FindFirstFileW(const char16_t* pattern, WIN32_FIND_DATAW* data) noexcept 
       return INVALID_HANDLE_VALUE;
     }
     bool matchAll = wildcard == u"*" || wildcard == u"*.*";
-    errno = 0;
+    std::vector<std::pair<std::string, unsigned char>> entries;
     while (struct dirent* entry = ::readdir(find->m_dir)) {
       if (matchAll || WildcardMatch(wildcard, Posix::ToUtf16(entry->d_name, std::strlen(entry->d_name)))) {
-        find->m_names.emplace_back(entry->d_name);
+        entries.emplace_back(entry->d_name, entry->d_type);
       }
     }
-    std::sort(find->m_names.begin(), find->m_names.end());
+    std::sort(entries.begin(), entries.end());
+    find->m_names.reserve(entries.size());
+    find->m_types.reserve(entries.size());
+    for (auto& entry : entries) {
+      find->m_names.push_back(std::move(entry.first));
+      find->m_types.push_back(entry.second);
+    }
   }
   if (!NextEntry(find, data)) {
     bool directoryMissing = find->m_dir == nullptr && MissingError(native) == ERROR_PATH_NOT_FOUND;
@@ -813,12 +864,44 @@ HANDLE FindFirstFileW(const char16_t* pattern, WIN32_FIND_DATAW* data) noexcept 
   return static_cast<HandleObject*>(find);
 }
 
+}  // namespace
+
+HANDLE FindFirstFileW(const char16_t* pattern, WIN32_FIND_DATAW* data) noexcept {
+  if (Check("FindFirstFile")) return INVALID_HANDLE_VALUE;
+  try {
+    return FindFirst(pattern, data, false);
+  } catch (...) {
+    SetLastError(ERROR_NOT_ENOUGH_MEMORY);
+    return INVALID_HANDLE_VALUE;
+  }
+}
+
+HANDLE FindFirstFileExW(const char16_t* pattern, int infoLevel, WIN32_FIND_DATAW* data, int searchOp, void* filter,
+                        DWORD) noexcept {
+  if (Check("FindFirstFile")) return INVALID_HANDLE_VALUE;
+  bool known = infoLevel == FindExInfoStandard || infoLevel == FindExInfoBasic || infoLevel == kFindExInfoNamesAndTypes;
+  if (!known || searchOp != FindExSearchNameMatch || filter != nullptr) {
+    SetLastError(ERROR_INVALID_PARAMETER);
+    return INVALID_HANDLE_VALUE;
+  }
+  try {
+    return FindFirst(pattern, data, infoLevel == kFindExInfoNamesAndTypes);
+  } catch (...) {
+    SetLastError(ERROR_NOT_ENOUGH_MEMORY);
+    return INVALID_HANDLE_VALUE;
+  }
+}
+
 BOOL FindNextFileW(HANDLE handle, WIN32_FIND_DATAW* data) noexcept {
   if (Check("FindNextFile")) return FALSE;
   FindObject* find = AsFind(handle);
   if (find == nullptr) return Fail(ERROR_INVALID_HANDLE);
   if (data == nullptr) return Fail(ERROR_INVALID_PARAMETER);
-  if (!NextEntry(find, data)) return Fail(ERROR_NO_MORE_FILES);
+  try {
+    if (!NextEntry(find, data)) return Fail(ERROR_NO_MORE_FILES);
+  } catch (...) {
+    return Fail(ERROR_NOT_ENOUGH_MEMORY);
+  }
   return TRUE;
 }
 
