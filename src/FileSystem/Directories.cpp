@@ -455,14 +455,9 @@ void CopyDirectory(const CString& strSourceDirectoryIn, const CString& strDestin
 
 namespace {
 
-// The walk of Enumerate. With `namesAndTypes` the find data carries only names and the
-// directory and link attributes, which is all a count needs and spares a query per entry.
-void Walk(const CString& dir, EnumerateCallback callback, void* context, bool& stop, bool recursive,
-          bool namesAndTypes = false) {
+void Walk(const CString& dir, EnumerateCallback callback, void* context, bool& stop, bool recursive) {
   WIN32_FIND_DATAW data;
-  AutoFindClose find(Platform::FindFirstFileExW(Paths::Combine(dir, u"*.*"),
-                                                namesAndTypes ? Platform::kFindExInfoNamesAndTypes : FindExInfoStandard,
-                                                &data, FindExSearchNameMatch, nullptr, 0));
+  AutoFindClose find(Platform::FindFirstFileW(Paths::Combine(dir, u"*.*"), &data));
   if (!find.IsValid()) return;
   do {
     if (stop) return;
@@ -473,7 +468,7 @@ void Walk(const CString& dir, EnumerateCallback callback, void* context, bool& s
       return;
     }
     if (recursive && IsTreeDirectory(data.dwFileAttributes)) {
-      Walk(path, callback, context, stop, recursive, namesAndTypes);
+      Walk(path, callback, context, stop, recursive);
     }
   } while (Platform::FindNextFileW(find.Get(), &data));
 }
@@ -490,14 +485,23 @@ struct Counts {
   ULONGLONG* files;
 };
 
-bool Count(const char16_t*, const WIN32_FIND_DATAW& data, void* context) {
-  auto* counts = static_cast<Counts*>(context);
-  if ((data.dwFileAttributes & FILE_ATTRIBUTE_DIRECTORY) != 0) {
-    ++*counts->directories;
-  } else {
-    ++*counts->files;
-  }
-  return true;
+// The walk of CountEntries: the walk of Enumerate with the counting callback built in, asking
+// only for names and types, and building paths only for the directories it descends into.
+void CountWalk(const CString& dir, bool recursive, bool& stop, Counts& counts) {
+  WIN32_FIND_DATAW data;
+  AutoFindClose find(Platform::FindFirstFileExW(Paths::Combine(dir, u"*.*"), Platform::kFindExInfoNamesAndTypes, &data,
+                                                FindExSearchNameMatch, nullptr, 0));
+  if (!find.IsValid()) return;
+  do {
+    if (stop) return;
+    if (IsDots(data.cFileName)) continue;
+    if ((data.dwFileAttributes & FILE_ATTRIBUTE_DIRECTORY) == 0) {
+      ++*counts.files;
+      continue;
+    }
+    ++*counts.directories;
+    if (recursive && !IsLink(data.dwFileAttributes)) CountWalk(Paths::Combine(dir, data.cFileName), recursive, stop, counts);
+  } while (Platform::FindNextFileW(find.Get(), &data));
 }
 
 }  // namespace
@@ -524,7 +528,7 @@ void CountEntries(const CString& strDir, bool recursive, bool& stop, ULONGLONG& 
   Counts counts{&directories, &files};
   PRECONDITION(!strDir.IsEmpty());
   CHECKPOINT_TRY
-    Walk(strDir, &Count, &counts, stop, recursive, true);
+    CountWalk(strDir, recursive, stop, counts);
   CHECKPOINT_CATCH
 }
 

@@ -257,6 +257,50 @@ TEST(PlatformFiles, FindUsesWindowsWildcardsInNameOrder) {
   EXPECT_EQ(GetLastError(), static_cast<DWORD>(ERROR_ACCESS_DENIED));
 }
 
+TEST(PlatformFiles, NamesAndTypesLevelSkipsTheDetails) {
+  Folder d;
+  WriteText(d.Native("f"), "12345");
+  fs::create_directories(d.Native("sub"));
+  ASSERT_EQ(::symlink(d.Native("sub").c_str(), d.Native("link").c_str()), 0);
+  WIN32_FIND_DATAW data;
+  HANDLE h = FindFirstFileExW((d / u"*").c_str(), kFindExInfoNamesAndTypes, &data, FindExSearchNameMatch, nullptr, 0);
+  ASSERT_NE(h, INVALID_HANDLE_VALUE);
+  std::vector<std::pair<std::u16string, DWORD>> seen;
+  do {
+    seen.emplace_back(data.cFileName, data.dwFileAttributes);
+    EXPECT_EQ(data.nFileSizeLow, 0u);
+  } while (FindNextFileW(h, &data));
+  FindClose(h);
+  using P = std::pair<std::u16string, DWORD>;
+  EXPECT_EQ(seen, (std::vector<P>{{u".", FILE_ATTRIBUTE_DIRECTORY},
+                                  {u"..", FILE_ATTRIBUTE_DIRECTORY},
+                                  {u"f", FILE_ATTRIBUTE_NORMAL},
+                                  {u"link", FILE_ATTRIBUTE_DIRECTORY | FILE_ATTRIBUTE_REPARSE_POINT},
+                                  {u"sub", FILE_ATTRIBUTE_DIRECTORY}}));
+  EXPECT_EQ(FindFirstFileExW((d / u"*").c_str(), 7, &data, FindExSearchNameMatch, nullptr, 0), INVALID_HANDLE_VALUE);
+  EXPECT_EQ(GetLastError(), static_cast<DWORD>(ERROR_INVALID_PARAMETER));
+}
+
+TEST(PlatformProcess, ModuleFileNames) {
+  char16_t buffer[4096];
+  DWORD n = GetModuleFileNameW(nullptr, buffer, 4096);
+  ASSERT_GT(n, 0u);
+  std::u16string path(buffer, n);
+  EXPECT_EQ(path.substr(path.size() - 15), u"\\tests_platform");
+  // Truncated, terminated, and reported as such.
+  EXPECT_EQ(GetModuleFileNameW(nullptr, buffer, 4), 4u);
+  EXPECT_EQ(GetLastError(), static_cast<DWORD>(ERROR_INSUFFICIENT_BUFFER));
+  EXPECT_EQ(buffer[3], 0);
+  // A handle that names no loaded module is refused, not followed.
+  int notAModule = 0;
+  EXPECT_EQ(GetModuleFileNameW(reinterpret_cast<HMODULE>(&notAModule), buffer, 4096), 0u);
+  EXPECT_EQ(GetLastError(), static_cast<DWORD>(ERROR_MOD_NOT_FOUND));
+  HMODULE self = GetModuleHandleFromAddress(reinterpret_cast<const void*>(&GetModuleFileNameW), false);
+  ASSERT_NE(self, nullptr);
+  EXPECT_EQ(GetModuleFileNameW(self, buffer, 4096), n);
+  EXPECT_EQ(GetModuleHandleFromAddress(nullptr, false), nullptr);
+}
+
 TEST(PlatformFiles, TemporaryNamesAreCreatedAndUnique) {
   Folder d;
   char16_t name1[MAX_PATH], name2[MAX_PATH];

@@ -10,6 +10,7 @@
 #include <unistd.h>
 
 #include <cerrno>
+#include <cstdint>
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
@@ -171,8 +172,12 @@ DWORD GetModuleFileNameW(HMODULE module, char16_t* buffer, DWORD size) noexcept 
   if (Check("GetModuleFileName")) return 0;
   std::string native;
   if (module != nullptr) {
-    struct link_map* map = nullptr;
-    if (::dlinfo(reinterpret_cast<void*>(module), RTLD_DI_LINKMAP, &map) != 0 || map == nullptr) {
+    // A module handle is the loader's handle (its link map), possibly tagged in its low bits (a
+    // module loaded as data file). Only a handle of a loaded module is looked at.
+    auto* wanted = reinterpret_cast<struct link_map*>(reinterpret_cast<std::uintptr_t>(module) & ~std::uintptr_t{7});
+    struct link_map* map = _r_debug.r_map;
+    while (map != nullptr && map != wanted) map = map->l_next;
+    if (map == nullptr) {
       SetLastError(ERROR_MOD_NOT_FOUND);
       return 0;
     }
