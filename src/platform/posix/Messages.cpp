@@ -334,10 +334,7 @@ DWORD FormatMessageW(DWORD flags, const void* source, DWORD messageId, DWORD lan
   }
 }
 
-void* LocalFree(void* memory) noexcept {
-  std::free(memory);
-  return nullptr;
-}
+// LocalFree is defined once, with the process services (posix/Process.cpp).
 
 DWORD ExpandEnvironmentStringsW(const char16_t* source, char16_t* destination, DWORD size) {
   if (source == nullptr) return Fail(ERROR_INVALID_PARAMETER);
