@@ -432,6 +432,30 @@ TEST_F(EventLoggerTest, MessagesOfTheSourcesMessageModule) {
   EXPECT_TRUE(Contains(records[0], u" - Warning]\nThere is not enough free space on E:\\.\r\n"));
 }
 
+TEST_F(EventLoggerTest, WarningsWithAnEventIdReachTheRegisteredLogger) {
+  TestLogger logger(0, LumoException::ToEventLog, u"OWWarnings");
+  void* handler = LmObjectGet(u"LM_EVENT_HANDLER");
+  ASSERT_TRUE(LmObjectAdd(u"LM_EVENT_HANDLER", static_cast<EventLogger*>(&logger)));
+  LumoException::detail::ReportWarningToEventHandler(0x40001234, u"Crash reporting: 50% of %1");
+  LumoException::detail::ReportWarningToEventHandler(u"plain");
+  ASSERT_TRUE(LmObjectAdd(u"LM_EVENT_HANDLER", handler));
+
+  HANDLE log = Platform::OpenEventLogW(nullptr, u"Application");
+  std::vector<BYTE> buffer(4096);
+  DWORD read = 0, needed = 0;
+  ASSERT_TRUE(Platform::ReadEventLogW(log, EVENTLOG_SEQUENTIAL_READ | EVENTLOG_FORWARDS_READ, 0, buffer.data(), 4096,
+                                      &read, &needed));
+  Platform::CloseEventLog(log);
+  EVENTLOGRECORD first, second;
+  std::memcpy(&first, buffer.data(), sizeof first);
+  std::memcpy(&second, buffer.data() + first.Length, sizeof second);
+  EXPECT_EQ(first.EventID, 0x40001234u);
+  EXPECT_EQ(first.EventType, 2);
+  EXPECT_EQ(std::u16string(reinterpret_cast<const char16_t*>(buffer.data() + first.StringOffset)),
+            u"Crash reporting: 50% of %1 \r\n");
+  EXPECT_EQ(second.EventID, 0xC0000000u);
+}
+
 TEST_F(EventLoggerTest, DamagedStoreIsAnEventLogFailure) {
   {
     std::ofstream garbage(m_dir + "/eventlog.db", std::ios::binary);
