@@ -1,5 +1,8 @@
 #include <gtest/gtest.h>
 
+#include <cstdint>
+#include <iterator>
+#include <memory>
 #include <string>
 
 #include "owutils/Exceptions.h"
@@ -197,6 +200,29 @@ TEST(ExceptionXml, HostileNestingNeverExhaustsTheStack) {
   for (int i = 0; i < 200000; ++i) tricky += u"<a x=\"/>\" y='>'>";
   RemoteException trickyRemote(tricky);
   EXPECT_EQ(std::u16string(trickyRemote.GetType().name), u"RemoteException");
+}
+
+TEST(ExceptionXml, DamagedTextNeverFailsTheReader) {
+  String xml;
+  try {
+    ThrowOuter();
+  } catch (Exception& e) {
+    xml = ToXml(e);
+  }
+  ASSERT_FALSE(xml.empty());
+  // Deterministic damage: replaced units (markup characters among them) and cut-off text.
+  const char16_t pieces[] = {u'<', u'>', u'/', u'"', u'\'', u'&', u'=', u'!', u'?', u'[', u'\u013C', u'\0'};
+  std::uint32_t seed = 12345;
+  auto next = [&seed] { return seed = seed * 1664525u + 1013904223u; };
+  for (int round = 0; round < 2000; ++round) {
+    String damaged = xml;
+    for (int n = 1 + next() % 4; n > 0; --n) damaged[next() % damaged.size()] = pieces[next() % std::size(pieces)];
+    if (next() % 3 == 0) damaged.resize(next() % damaged.size());
+    RemoteException remote(damaged);
+    EXPECT_LE(ChainLength(remote), 3u);
+    EXPECT_FALSE(remote.ToString().empty());
+    (void)ToXml(remote);
+  }
 }
 
 TEST(ExceptionXml, ThrowAndCloneKeepTheRemoteType) {

@@ -95,7 +95,15 @@ TEST_F(ModulesTest, DatafileHandlesServeResourcesOnly) {
   EXPECT_GT(Platform::LoadStringW(module, 1, buffer, 64), 0);
   EXPECT_EQ(std::u16string(buffer), u"Engine English");
   EXPECT_EQ(Platform::GetProcAddress(module, "__OEMData"), nullptr);
+
+  // Loaded both ways, the module stays until both references are gone.
+  HMODULE normal = Platform::LoadLibraryW(PathOf(folder, "OWEngineRes409.so").c_str());
+  ASSERT_NE(normal, nullptr);
+  EXPECT_NE(Platform::GetProcAddress(normal, "__OEMData"), nullptr);
   EXPECT_TRUE(Platform::FreeLibrary(module));
+  EXPECT_EQ(Platform::LoadStringW(normal, 1, buffer, 64), 14);
+  EXPECT_TRUE(Platform::FreeLibrary(normal));
+  EXPECT_FALSE(Platform::FreeLibrary(normal));  // no reference left to drop
 }
 
 TEST_F(ModulesTest, ModuleHandlesByNameAndAddress) {

@@ -2,6 +2,9 @@
 
 #include <gtest/gtest.h>
 
+#include <cstdint>
+#include <iterator>
+
 #include "owutils/Exceptions.h"
 #include "support/TestEnvironment.h"
 
@@ -141,6 +144,28 @@ TEST(SpecialChars, Decode) {
                                                                        &causeMessage),
             u"LumoStringInvalidHexCharW");
   EXPECT_EQ(causeMessage, u"'\u00e9' is not a valid hexadecimal character.");
+}
+
+TEST(Encodings, DecodersOnlyEverRaiseTheirOwnFailure) {
+  const char16_t alphabet[] = {u'%', u'%', u'0', u'9', u'a', u'F', u'g', u'G', u' ', u'/', u'~', u'\u00e9', u'\u4e2d', 0xD800};
+  std::uint32_t seed = 2024;
+  auto next = [&seed] { return seed = seed * 1664525u + 1013904223u; };
+  for (int round = 0; round < 3000; ++round) {
+    String text;
+    for (int n = next() % 9; n > 0; --n) text.push_back(alphabet[next() % std::size(alphabet)]);
+    try {
+      Lumo::DecodeURI(text.c_str());
+    } catch (LumoStringUnableToDecodeStringFromURI& e) {
+      EXPECT_EQ(e.m_text, text);
+      ASSERT_NE(e.GetCause(), nullptr);
+    }
+    try {
+      Lumo::DecodeSpecialChars(text.c_str());
+    } catch (LumoStringUnableToDecodeSpecialCharsInString& e) {
+      EXPECT_EQ(e.m_text, text);
+      ASSERT_NE(e.GetCause(), nullptr);
+    }
+  }
 }
 
 TEST(Encodings, RoundTripWellFormedText) {

@@ -1,5 +1,6 @@
 // The registry store: Win32 result codes, case rules, typed values, several processes.
 #include <gtest/gtest.h>
+#include <sys/stat.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -11,6 +12,7 @@
 #include <vector>
 
 #include "platform/Registry.h"
+#include "platform/StateDirectory.h"
 #include "support/TestEnvironment.h"
 
 using namespace Platform;
@@ -278,4 +280,44 @@ TEST(Registry, DamagedStoreFailsWithCodeAndRecovers) {
   std::remove((dir + "/registry.db").c_str());
   EXPECT_EQ(RegCreateKeyExW(HKEY_CURRENT_USER, u"Software", 0, nullptr, 0, KEY_ALL_ACCESS, nullptr, &key.h, nullptr),
             ERROR_SUCCESS);
+}
+
+TEST(StateDirectory, VariableThenXdgThenHomeAndFailure) {
+  const std::string old = std::getenv("OWUTILS_STATE_DIR");
+  const char* oldXdg = std::getenv("XDG_STATE_HOME");
+  const std::string savedXdg = oldXdg == nullptr ? "" : oldXdg;
+  const std::string oldHome = std::getenv("HOME") == nullptr ? "" : std::getenv("HOME");
+  const std::string base = OwTest::MakeTempDirectory("statedir");
+  std::u16string path;
+
+  setenv("OWUTILS_STATE_DIR", (base + "/explicit/deeper").c_str(), 1);
+  ASSERT_TRUE(GetStateDirectory(path));
+  EXPECT_EQ(OwTest::Narrow(path), base + "/explicit/deeper");
+  struct stat st;
+  ASSERT_EQ(stat((base + "/explicit/deeper").c_str(), &st), 0);
+  EXPECT_EQ(st.st_mode & 0777, 0700u);
+
+  // The defaults of other users (root's, /var/lib/owutils, is not touched here).
+  if (geteuid() != 0) {
+    unsetenv("OWUTILS_STATE_DIR");
+    setenv("XDG_STATE_HOME", (base + "/xdg").c_str(), 1);
+    ASSERT_TRUE(GetStateDirectory(path));
+    EXPECT_EQ(OwTest::Narrow(path), base + "/xdg/owutils");
+
+    unsetenv("XDG_STATE_HOME");
+    setenv("HOME", (base + "/home").c_str(), 1);
+    ASSERT_TRUE(GetStateDirectory(path));
+    EXPECT_EQ(OwTest::Narrow(path), base + "/home/.local/state/owutils");
+  }
+
+  // A state folder that cannot be made: the stores fail with the system's code.
+  { std::ofstream file(base + "/file"); }
+  setenv("OWUTILS_STATE_DIR", (base + "/file/sub").c_str(), 1);
+  EXPECT_FALSE(GetStateDirectory(path));
+  HKEY key = nullptr;
+  EXPECT_EQ(RegOpenKeyExW(HKEY_CURRENT_USER, u"Software", 0, KEY_READ, &key), ERROR_PATH_NOT_FOUND);
+
+  setenv("HOME", oldHome.c_str(), 1);
+  if (oldXdg != nullptr) setenv("XDG_STATE_HOME", savedXdg.c_str(), 1);
+  setenv("OWUTILS_STATE_DIR", old.c_str(), 1);
 }
