@@ -7,6 +7,8 @@
 #include <gtest/gtest.h>
 
 #include <atomic>
+#include <cstdio>
+#include <mutex>
 #include <chrono>
 #include <thread>
 
@@ -134,6 +136,10 @@ TEST(StressConcurrency, ThreadsShareEventsNamesRegistryAndFiles) {
     if (text.rfind(u"c-t", 0) == 0) counted += count;
   }
   EXPECT_EQ(counted, total);
+  long writes = 0, encrypted = 0;
+  for (const auto& result : results) writes += result.registryWrites, encrypted += result.encryptions;
+  std::printf("%d threads, %.0f s: %ld events, %ld registry values, %ld file round trips\n", kThreads, seconds, total,
+              writes, encrypted);
   EXPECT_EQ(LmObjectGet(u"stress-shared"), &shared);
   LmObjectDel(u"stress-shared");
 }
@@ -210,6 +216,8 @@ TEST(StressProcesses, SeveralProcessesShareTheStores) {
     if (text.size() > 1 && text[0] == u'p' && text.find(u"-t") != std::u16string::npos) fromChildren += count;
   }
   EXPECT_EQ(fromChildren, static_cast<long>(events.size()));
+  std::printf("%d processes, %.0f s: %zu events, %zu registry values; here %ld registry reads, %ld file round trips\n",
+              kProcesses, seconds, events.size(), values.size(), reads.load(), encryptions.load());
   for (const auto& value : values) {
     const size_t blank = value.find(' ');
     const std::u16string key = u"Software\\OwReliability\\Stress\\" + OwTest::Widen(value.substr(0, blank));
