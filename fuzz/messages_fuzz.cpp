@@ -74,6 +74,12 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
   result = Platform::FormatMessageW(flags | FORMAT_MESSAGE_ALLOCATE_BUFFER, text.c_str(), 0, 0,
                                     reinterpret_cast<char16_t*>(&allocated), 0,
                                     reinterpret_cast<va_list*>(inserts.data()));
+  if (std::getenv("OWFUZZ_DUMP") != nullptr) {
+    std::fprintf(stderr, "template %zu units, text %zu units, allocated result %u\n", text.size(), whole.size(),
+                 static_cast<unsigned>(result));
+    for (char16_t c : whole) std::fprintf(stderr, "%04X ", static_cast<unsigned>(c));
+    std::fprintf(stderr, "\n");
+  }
   if (!whole.empty()) {
     FUZZ_CHECK(result == whole.size() && allocated != nullptr);
     FUZZ_CHECK(std::u16string(allocated) == whole);

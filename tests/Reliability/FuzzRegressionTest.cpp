@@ -3,9 +3,12 @@
 #include <gtest/gtest.h>
 
 #include "GuardedMemory.h"
+#include "support/TestEnvironment.h"
 #include "owutils/Exceptions.h"
 #include "owutils/RemoteException.h"
 #include "owutils/tstring.h"
+#include "platform/Errors.h"
+#include "platform/Messages.h"
 
 namespace {
 
@@ -36,6 +39,27 @@ TEST(FuzzRegressionXml, WhiteSpaceAroundTextSurvivesTheExchange) {
   LumoException::RemoteException first{Lumo::String(u"  a b \r\n")};
   LumoException::RemoteException second(LumoException::ToXml(first));
   EXPECT_EQ(second.GetMessage(), first.GetMessage());
+}
+
+// messages: an insert's printf specification holding a '%' of its own ("%1!s%s!") was handed
+// to the printf engine as a whole format, which then read further arguments than the one the
+// insert supplies: garbage from the registers, or a crash for a further %s. Such a
+// specification is refused like any other malformed insert.
+TEST(FuzzRegressionMessages, InsertSpecificationWithItsOwnPercentIsRefused) {
+  const char16_t* texts[] = {u"one", u"two", u"three"};
+  for (const char16_t* format : {u"%1!s%s!", u"%1!d%A!", u"%2!A%hA% ad nos!", u"%1!%!", u"%1!*%s!"}) {
+    char16_t buffer[256] = {};
+    Platform::SetLastError(ERROR_SUCCESS);
+    const DWORD n = Platform::FormatMessageW(FORMAT_MESSAGE_FROM_STRING | FORMAT_MESSAGE_ARGUMENT_ARRAY, format, 0, 0,
+                                             buffer, 256, reinterpret_cast<va_list*>(texts));
+    EXPECT_EQ(n, 0u) << OwTest::Narrow(format);
+    EXPECT_EQ(Platform::GetLastError(), static_cast<DWORD>(ERROR_INVALID_PARAMETER)) << OwTest::Narrow(format);
+  }
+  // Well-formed specifications still work.
+  char16_t buffer[256] = {};
+  const DWORD n = Platform::FormatMessageW(FORMAT_MESSAGE_FROM_STRING | FORMAT_MESSAGE_ARGUMENT_ARRAY,
+                                           u"%1!s! %2!5s!|%%", 0, 0, buffer, 256, reinterpret_cast<va_list*>(texts));
+  EXPECT_EQ(std::u16string(buffer, n), u"one   two|%");
 }
 
 }  // namespace
