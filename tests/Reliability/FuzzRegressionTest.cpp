@@ -44,10 +44,11 @@ TEST(FuzzRegressionXml, WhiteSpaceAroundTextSurvivesTheExchange) {
 // messages: an insert's printf specification holding a '%' of its own ("%1!s%s!") was handed
 // to the printf engine as a whole format, which then read further arguments than the one the
 // insert supplies: garbage from the registers, or a crash for a further %s. Such a
-// specification is refused like any other malformed insert.
+// specification is refused like any other malformed insert. So is one with more than the two
+// '*' a width and a precision can take ("%1!*.*.*s!" wrote a third width past its array).
 TEST(FuzzRegressionMessages, InsertSpecificationWithItsOwnPercentIsRefused) {
-  const char16_t* texts[] = {u"one", u"two", u"three"};
-  for (const char16_t* format : {u"%1!s%s!", u"%1!d%A!", u"%2!A%hA% ad nos!", u"%1!%!", u"%1!*%s!"}) {
+  const char16_t* texts[] = {u"one", u"two", u"three", u"four", u"five", u"six", u"seven", u"eight"};
+  for (const char16_t* format : {u"%1!s%s!", u"%1!d%A!", u"%2!A%hA% ad nos!", u"%1!%!", u"%1!*%s!", u"%1!*.*.*s!", u"%1!***s!"}) {
     char16_t buffer[256] = {};
     Platform::SetLastError(ERROR_SUCCESS);
     const DWORD n = Platform::FormatMessageW(FORMAT_MESSAGE_FROM_STRING | FORMAT_MESSAGE_ARGUMENT_ARRAY, format, 0, 0,
