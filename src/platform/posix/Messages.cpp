@@ -36,7 +36,7 @@ struct Piece {
 
 // The kind of value a printf specification takes; false for one FormatMessage refuses.
 bool KindOf(const std::u16string& spec, Kind& kind) {
-  if (spec.empty()) return false;
+  if (spec.empty() || spec.find(u'%') != std::u16string::npos) return false;  // one conversion, no more
   const char16_t conversion = spec.back();
   switch (conversion) {
     case u's':
@@ -111,7 +111,7 @@ bool Parse(const std::u16string& text, bool ignoreInserts, DWORD width, std::vec
       piece.index = index;
       piece.spec = spec;
       for (char16_t s : spec) piece.stars += s == u'*' ? 1 : 0;
-      if (!KindOf(spec, piece.kind) || index + piece.stars > kMaxInsert) return false;
+      if (!KindOf(spec, piece.kind) || piece.stars > 2 || index + piece.stars > kMaxInsert) return false;
       flush();
       pieces.push_back(std::move(piece));
       continue;
