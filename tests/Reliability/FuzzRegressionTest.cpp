@@ -45,10 +45,13 @@ TEST(FuzzRegressionXml, WhiteSpaceAroundTextSurvivesTheExchange) {
 // to the printf engine as a whole format, which then read further arguments than the one the
 // insert supplies: garbage from the registers, or a crash for a further %s. Such a
 // specification is refused like any other malformed insert. So is one with more than the two
-// '*' a width and a precision can take ("%1!*.*.*s!" wrote a third width past its array).
+// '*' a width and a precision can take ("%1!*.*.*s!" wrote a third width past its array), and
+// one with anything after its conversion: in "%49!S .*s!" the engine took %S and read the
+// width meant for the '*' as a string pointer.
 TEST(FuzzRegressionMessages, InsertSpecificationWithItsOwnPercentIsRefused) {
   const char16_t* texts[] = {u"one", u"two", u"three", u"four", u"five", u"six", u"seven", u"eight"};
-  for (const char16_t* format : {u"%1!s%s!", u"%1!d%A!", u"%2!A%hA% ad nos!", u"%1!%!", u"%1!*%s!", u"%1!*.*.*s!", u"%1!***s!"}) {
+  for (const char16_t* format : {u"%1!s%s!", u"%1!d%A!", u"%2!A%hA% ad nos!", u"%1!%!", u"%1!*%s!", u"%1!*.*.*s!", u"%1!***s!", u"%4!S .*s!",
+                             u"%1!s*!", u"%1!d x!"}) {
     char16_t buffer[256] = {};
     Platform::SetLastError(ERROR_SUCCESS);
     const DWORD n = Platform::FormatMessageW(FORMAT_MESSAGE_FROM_STRING | FORMAT_MESSAGE_ARGUMENT_ARRAY, format, 0, 0,
@@ -57,10 +60,13 @@ TEST(FuzzRegressionMessages, InsertSpecificationWithItsOwnPercentIsRefused) {
     EXPECT_EQ(Platform::GetLastError(), static_cast<DWORD>(ERROR_INVALID_PARAMETER)) << OwTest::Narrow(format);
   }
   // Well-formed specifications still work.
+  const DWORD_PTR widths[] = {reinterpret_cast<DWORD_PTR>(u"one"), reinterpret_cast<DWORD_PTR>(u"two"), 5, 2,
+                              reinterpret_cast<DWORD_PTR>(u"four")};
   char16_t buffer[256] = {};
   const DWORD n = Platform::FormatMessageW(FORMAT_MESSAGE_FROM_STRING | FORMAT_MESSAGE_ARGUMENT_ARRAY,
-                                           u"%1!s! %2!5s!|%%", 0, 0, buffer, 256, reinterpret_cast<va_list*>(texts));
-  EXPECT_EQ(std::u16string(buffer, n), u"one   two|%");
+                                           u"%1!s! %2!5s!|%%|%3!-*.*s!|", 0, 0, buffer, 256,
+                                           reinterpret_cast<va_list*>(widths));
+  EXPECT_EQ(std::u16string(buffer, n), u"one   two|%|fo   |");
 }
 
 }  // namespace
