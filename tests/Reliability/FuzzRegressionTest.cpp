@@ -60,7 +60,7 @@ TEST(FuzzRegressionMessages, InsertSpecificationWithItsOwnPercentIsRefused) {
     EXPECT_EQ(Platform::GetLastError(), static_cast<DWORD>(ERROR_INVALID_PARAMETER)) << OwTest::Narrow(format);
   }
   // Well-formed specifications still work.
-  const DWORD_PTR widths[] = {reinterpret_cast<DWORD_PTR>(u"one"), reinterpret_cast<DWORD_PTR>(u"two"), 5, 2,
+  DWORD_PTR widths[] = {reinterpret_cast<DWORD_PTR>(u"one"), reinterpret_cast<DWORD_PTR>(u"two"), 5, 2,
                               reinterpret_cast<DWORD_PTR>(u"four")};
   char16_t buffer[256] = {};
   const DWORD n = Platform::FormatMessageW(FORMAT_MESSAGE_FROM_STRING | FORMAT_MESSAGE_ARGUMENT_ARRAY,
