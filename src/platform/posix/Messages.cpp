@@ -34,9 +34,10 @@ struct Piece {
   Kind kind = Kind::Pointer;
 };
 
-// The kind of value a printf specification takes; false for one FormatMessage refuses.
+// The kind of value a printf specification takes; false for one FormatMessage refuses. A
+// specification is flag, width, precision and length characters, then its one conversion.
 bool KindOf(const std::u16string& spec, Kind& kind) {
-  if (spec.empty() || spec.find(u'%') != std::u16string::npos) return false;  // one conversion, no more
+  if (spec.empty() || spec.find_first_not_of(u"-+ #0123456789.*hlwIjztL") != spec.size() - 1) return false;
   const char16_t conversion = spec.back();
   switch (conversion) {
     case u's':
