@@ -1,5 +1,6 @@
-// Path operations: GetRootLength, GetRoot, IsLongPath, ToLongPath, FromLongPath, Combine and
-// the bridge to native paths.
+// Path operations: GetRootLength, GetRoot, IsLongPath, ToLongPath, FromLongPath, Combine, the
+// bridge to native paths, and the path text of Directories (IsRoot, GetParentDirectory,
+// GetContainingPath, GetDirectoryName, GetDrive, StripDrive, trailing backslashes).
 //
 // Input bytes pick characters from a small alphabet of what matters in paths (backslashes,
 // colons, '?', "UNC" letters, dots, slashes, blanks, a non-ASCII letter), so that drive, UNC
@@ -8,6 +9,7 @@
 // that prefix; ToLongPath gives a long path, and FromLongPath takes drive and UNC paths back to
 // themselves; Combine keeps both parts; native conversions raise only the library's exceptions.
 #include "FuzzSupport.h"
+#include "owutils/Directories.h"
 #include "owutils/Exceptions.h"
 #include "owutils/Paths.h"
 
@@ -77,6 +79,35 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
   FUZZ_CHECK(joined.rfind(text, 0) == 0);
   FUZZ_CHECK(joined.size() >= text.size() + second.size());
   FUZZ_CHECK(joined.compare(joined.size() - second.size(), second.size(), second) == 0);
+
+  // Directory path text: results are pieces of the path; only the documented exceptions.
+  const bool endsWithBackslash = text.back() == u'\\';
+  CString withSlash(path);
+  Directories::AddTrailingBackslash(withSlash);
+  FUZZ_CHECK(std::u16string(withSlash.GetString()) == (endsWithBackslash ? text : text + u"\\"));
+  const std::u16string without(Directories::RemoveTrailingBackslash(path).GetString());
+  FUZZ_CHECK(without == (endsWithBackslash ? text.substr(0, text.size() - 1) : text));
+  try {
+    const bool root = Directories::IsRoot(path);
+    const std::u16string parent(Directories::GetParentDirectory(path).GetString());
+    FUZZ_CHECK(parent.size() <= text.size() + 1);
+    const std::u16string containing(Directories::GetContainingPath(path).GetString());
+    if (root) FUZZ_CHECK(containing.empty());
+    if (!root) FUZZ_CHECK(text.rfind(containing, 0) == 0);
+    try {
+      const std::u16string name(Directories::GetDirectoryName(path).GetString());
+      FUZZ_CHECK(!root);
+      FUZZ_CHECK(without.size() >= name.size() &&
+                 without.compare(without.size() - name.size(), name.size(), name) == 0);
+    } catch (const FileSystemException&) {
+      FUZZ_CHECK(root);
+    }
+  } catch (const InvalidUncPath&) {
+  }
+  const std::u16string drive(Directories::GetDrive(path).GetString());
+  FUZZ_CHECK(text.rfind(drive, 0) == 0);
+  const std::u16string stripped2(Directories::StripDrive(path).GetString());
+  FUZZ_CHECK(stripped2.size() <= text.size());
 
   // Native paths: only the library's exceptions.
   try {
