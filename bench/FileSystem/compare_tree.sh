@@ -4,12 +4,14 @@
 #   GetTreeSize vs du -sb, CountEntries vs find | wc -l, CopyDirectory vs cp -r,
 #   RemoveDirectoryTree vs rm -rf.
 # Usage: bench/FileSystem/compare_tree.sh <bench_tree_bench binary> [folders] [files per folder]
-# Default tree: 100,000 files in 1,000 folders of 100 bytes each, under /tmp.
+# Default tree: 100,000 files of 100 bytes in 1,000 folders, under $TREE_BASE (default /tmp;
+# TREE_BASE=/dev/shm takes the disk's write-back out of the figures).
+# Each row gives wall-clock seconds and CPU seconds (user + system) of both, and the wall ratio.
 set -euo pipefail
 bench=${1:?path to bench_tree_bench}
 folders=${2:-1000}
 files=${3:-100}
-root=$(mktemp -d /tmp/owutils-tree-XXXXXX)
+root=$(mktemp -d "${TREE_BASE:-/tmp}/owutils-tree-XXXXXX")
 trap 'rm -rf "$root"' EXIT
 
 echo "building $((folders * files)) files in $folders folders under $root"
@@ -26,48 +28,47 @@ for f in range(folders):
 PY
 sync
 
-# Seconds taken by a command (output discarded), best of three runs with a warm cache.
-timeit() {
-  local best=""
+# "wall cpu" seconds of one run of a command (output discarded).
+measure() {
+  local out
+  out=$( { /usr/bin/time -f "%e %U %S" "$@" > /dev/null; } 2>&1 | tail -1)
+  echo "$out" | awk '{ printf "%.3f %.3f\n", $1, $2 + $3 }'
+}
+# Best of three runs (by wall time), for commands that leave the tree as it is.
+best() {
+  local best="" line
   for _ in 1 2 3; do
-    local start end
-    start=$(date +%s.%N)
-    "$@" > /dev/null
-    end=$(date +%s.%N)
-    local t
-    t=$(echo "$end - $start" | bc)
-    if [ -z "$best" ] || [ "$(echo "$t < $best" | bc)" = 1 ]; then best=$t; fi
+    line=$(measure "$@")
+    if [ -z "$best" ] || [ "$(echo "${line%% *} < ${best%% *}" | bc)" = 1 ]; then best=$line; fi
   done
   echo "$best"
 }
-# A command that consumes its input tree: time it once per fresh copy.
-timeonce() {
-  local start end
-  start=$(date +%s.%N)
-  "$@" > /dev/null
-  end=$(date +%s.%N)
-  echo "$end - $start" | bc
+row() {
+  local name=$1 ours=$2 peerName=$3 peer=$4
+  local ratio
+  ratio=$(echo "scale=2; ${ours%% *} / ${peer%% *}" | bc)
+  printf '%-20s %8.3f s (cpu %6.3f)   %-13s %8.3f s (cpu %6.3f)   ratio %s\n' \
+    "$name" "${ours%% *}" "${ours##* }" "$peerName" "${peer%% *}" "${peer##* }" "$ratio"
 }
-ratio() { echo "scale=2; $1 / $2" | bc; }
-row() { printf '%-22s %9.3f s   %-16s %9.3f s   ratio %s\n' "$1" "$2" "$3" "$4" "$(ratio "$2" "$4")"; }
 
-echo "checks: GetTreeSize=$("$bench" --op size "$root/src") du -sb=$(du -sb --apparent-size "$root/src" | cut -f1)" \
+echo "checks: GetTreeSize=$("$bench" --op size "$root/src") bytes in files" \
+     "(du -sb with folders: $(du -sb "$root/src" | cut -f1))," \
      "CountEntries=$("$bench" --op count "$root/src") find=$(($(find "$root/src" | wc -l) - 1))"
 
-ours=$(timeit "$bench" --op size "$root/src")
-peer=$(timeit du -sb "$root/src")
-row GetTreeSize "$ours" "du -sb" "$peer"
+row GetTreeSize "$(best "$bench" --op size "$root/src")" "du -sb" "$(best du -sb "$root/src")"
+row CountEntries "$(best "$bench" --op count "$root/src")" "find | wc -l" "$(best sh -c "find '$root/src' | wc -l")"
 
-ours=$(timeit "$bench" --op count "$root/src")
-peer=$(timeit sh -c "find '$root/src' | wc -l")
-row CountEntries "$ours" "find | wc -l" "$peer"
-
+# Copies and removals write: each starts after the device has settled (sync), the peer first.
 rm -rf "$root/a" "$root/b"
-ours=$(timeonce "$bench" --op copy "$root/src" "$root/a")
-peer=$(timeonce cp -r "$root/src" "$root/b")
+sync; sleep 2
+peer=$(measure cp -r "$root/src" "$root/b")
+sync; sleep 2
+ours=$(measure "$bench" --op copy "$root/src" "$root/a")
 row CopyDirectory "$ours" "cp -r" "$peer"
-sync
+if ! diff -r "$root/src" "$root/a" > /dev/null; then echo "copy differs from its source"; fi
 
-ours=$(timeonce "$bench" --op remove "$root/a")
-peer=$(timeonce rm -rf "$root/b")
+sync; sleep 2
+peer=$(measure rm -rf "$root/b")
+sync; sleep 2
+ours=$(measure "$bench" --op remove "$root/a")
 row RemoveDirectoryTree "$ours" "rm -rf" "$peer"

@@ -242,6 +242,35 @@ void CreateDirectories(const CString& cstrDirectory) {
 // --- Deletion ---------------------------------------------------------------------------------
 
 
+namespace {
+
+// Lists names and types only: the read-only flag, the one detail deletion cares about, is looked
+// at when a deletion is refused, so that a tree costs no query per entry.
+HANDLE FindNamesAndTypes(const CString& pattern, WIN32_FIND_DATAW& data) {
+  return Platform::FindFirstFileExW(pattern, Platform::kFindExInfoNamesAndTypes, &data, FindExSearchNameMatch, nullptr,
+                                    0);
+}
+
+// Clears the read-only flag of `path` when it is set; true when it was set.
+bool ClearReadOnly(const CString& path) {
+  DWORD attributes = Platform::GetFileAttributesW(path);
+  if (attributes == INVALID_FILE_ATTRIBUTES || (attributes & FILE_ATTRIBUTE_READONLY) == 0) return false;
+  Platform::SetFileAttributesW(path, attributes & ~FILE_ATTRIBUTE_READONLY);
+  return true;
+}
+
+// Deletes a file, clearing its read-only flag when that is what refused the deletion. False with
+// the deletion's error as last error.
+bool DeleteClearingReadOnly(const CString& path) {
+  if (Platform::DeleteFileW(path)) return true;
+  DWORD error = Platform::GetLastError();
+  if (error == ERROR_ACCESS_DENIED && ClearReadOnly(path)) return Platform::DeleteFileW(path) != FALSE;
+  Platform::SetLastError(error);
+  return false;
+}
+
+}  // namespace
+
 bool TryDeleteFiles(const CString& strDirectory, const CString& strFilePatternMatch) {
   PRECONDITION(!strDirectory.IsEmpty());
   PRECONDITION(!strFilePatternMatch.IsEmpty());
@@ -249,14 +278,11 @@ bool TryDeleteFiles(const CString& strDirectory, const CString& strFilePatternMa
     CString base = Paths::ToLongPath(strDirectory);
     AddTrailingBackslash(base);
     WIN32_FIND_DATAW data;
-    AutoFindClose find(Platform::FindFirstFileW(base + strFilePatternMatch, &data));
+    AutoFindClose find(FindNamesAndTypes(base + strFilePatternMatch, data));
     if (!find.IsValid()) return true;
     do {
       if (IsDots(data.cFileName)) continue;
       CString path = base + data.cFileName;
-      if ((data.dwFileAttributes & FILE_ATTRIBUTE_READONLY) != 0) {
-        Platform::SetFileAttributesW(path, data.dwFileAttributes & ~FILE_ATTRIBUTE_READONLY);
-      }
       if (IsLink(data.dwFileAttributes)) {
         // The link goes; what it points to is not part of this tree.
         if ((data.dwFileAttributes & FILE_ATTRIBUTE_DIRECTORY) != 0) {
@@ -265,9 +291,10 @@ bool TryDeleteFiles(const CString& strDirectory, const CString& strFilePatternMa
           Platform::DeleteFileW(path);
         }
       } else if ((data.dwFileAttributes & FILE_ATTRIBUTE_DIRECTORY) != 0) {
+        ClearReadOnly(path);
         TryRemoveDirectoryTree(path);
       } else {
-        Files::TryDeleteFile(path);
+        DeleteClearingReadOnly(path);
       }
     } while (Platform::FindNextFileW(find.Get(), &data));
     return true;
@@ -281,14 +308,11 @@ void DeleteFiles(const CString& strDirectory, const CString& strFilePatternMatch
     CString base = Paths::ToLongPath(strDirectory);
     AddTrailingBackslash(base);
     WIN32_FIND_DATAW data;
-    AutoFindClose find(Platform::FindFirstFileW(base + strFilePatternMatch, &data));
+    AutoFindClose find(FindNamesAndTypes(base + strFilePatternMatch, data));
     if (!find.IsValid()) return;
     do {
       if (IsDots(data.cFileName)) continue;
       CString path = base + data.cFileName;
-      if ((data.dwFileAttributes & FILE_ATTRIBUTE_READONLY) != 0) {
-        Platform::SetFileAttributesW(path, data.dwFileAttributes & ~FILE_ATTRIBUTE_READONLY);
-      }
       if (IsLink(data.dwFileAttributes)) {
         if ((data.dwFileAttributes & FILE_ATTRIBUTE_DIRECTORY) != 0) {
           if (!Platform::RemoveDirectoryW(path)) THROW_AT(LumoException::Win32Error(u"RemoveDirectory"));
@@ -296,9 +320,11 @@ void DeleteFiles(const CString& strDirectory, const CString& strFilePatternMatch
           Files::DeleteFile(path);
         }
       } else if ((data.dwFileAttributes & FILE_ATTRIBUTE_DIRECTORY) != 0) {
+        ClearReadOnly(path);
         RemoveDirectoryTree(path);
-      } else {
-        Files::DeleteFile(path);
+      } else if (!DeleteClearingReadOnly(path)) {
+        // Raised as DeleteFile raises it.
+        THROW_AT(UnableToDeleteFile(path.str(), LumoException::Win32Error(u"DeleteFile")));
       }
     } while (Platform::FindNextFileW(find.Get(), &data));
   } catch (LumoException::Exception& e) {
@@ -375,7 +401,7 @@ DWORD TryCopyTree(const CString& source, const CString& destination, const Ident
     destinationRoot = &rootIdentity;
   }
   WIN32_FIND_DATAW data;
-  AutoFindClose find(Platform::FindFirstFileW(source + u"\\*.*", &data));
+  AutoFindClose find(FindNamesAndTypes(source + u"\\*.*", data));
   if (!find.IsValid()) return ERROR_SUCCESS;
   do {
     if (IsDots(data.cFileName)) continue;
@@ -387,12 +413,12 @@ DWORD TryCopyTree(const CString& source, const CString& destination, const Ident
       if (IsDestinationRoot(sourceItem, destinationRoot)) continue;
       DWORD result = TryCopyTree(sourceItem, destinationItem, destinationRoot);
       if (result != ERROR_SUCCESS) return result;
-    } else {
-      if (Files::Exists(destinationItem)) {
-        // A file copied onto itself stays as it is; deleting it first would lose it.
-        if (FileSystemInternal::SameFile(sourceItem, destinationItem)) continue;
-        if (!Platform::DeleteFileW(destinationItem)) return Platform::GetLastError();
-      }
+    } else if (!Platform::CopyFileW(sourceItem, destinationItem, TRUE)) {
+      // An existing destination is replaced, unless it is the source itself: deleting that
+      // first would lose it.
+      if (Platform::GetLastError() != ERROR_FILE_EXISTS) return Platform::GetLastError();
+      if (FileSystemInternal::SameFile(sourceItem, destinationItem)) continue;
+      if (!Platform::DeleteFileW(destinationItem)) return Platform::GetLastError();
       if (!Platform::CopyFileW(sourceItem, destinationItem, TRUE)) return Platform::GetLastError();
     }
   } while (Platform::FindNextFileW(find.Get(), &data));
@@ -410,7 +436,7 @@ void CopyTree(const CString& source, const CString& destination, const Identity*
       destinationRoot = &rootIdentity;
     }
     WIN32_FIND_DATAW data;
-    AutoFindClose find(Platform::FindFirstFileW(pattern, &data));
+    AutoFindClose find(FindNamesAndTypes(pattern, data));
     if (!find.IsValid()) THROW_AT(LumoException::Win32Error(u"FindFirstFile"));
     do {
       if (IsDots(data.cFileName)) continue;
@@ -424,7 +450,8 @@ void CopyTree(const CString& source, const CString& destination, const Identity*
         if (IsDestinationRoot(Paths::ToLongPath(sourceItem), destinationRoot)) continue;
         CopyTree(sourceItem, destinationItem, destinationRoot);
       } else {
-        Files::CopyFile(sourceItem, destinationItem);
+        // The destination directory exists already: the copy itself, as CopyFile makes it.
+      FileSystemInternal::CopyFileInto(sourceItem, destinationItem);
       }
     } while (Platform::FindNextFileW(find.Get(), &data));
     DWORD error = Platform::GetLastError();

@@ -22,4 +22,7 @@ bool GetIdentity(const CString& longPath, Identity& identity);
 // True when both paths exist and name the same file (device and inode), whatever the names.
 bool SameFile(const CString& longPathA, const CString& longPathB);
 
+// Files::CopyFile without creating the destination's directory, for callers that made it.
+void CopyFileInto(const CString& strSourceFile, const CString& strDestinationFile);
+
 }  // namespace FileSystemInternal

@@ -52,22 +52,32 @@ bool TryCopyFile(const CString& strSourceFile, const CString& strDestinationFile
   CHECKPOINT_CATCH
 }
 
-void CopyFile(const CString& strSourceFile, const CString& strDestinationFile) {
+namespace {
+
+void Copy(const CString& strSourceFile, const CString& strDestinationFile, bool createDirectory) {
   PRECONDITION(!strSourceFile.IsEmpty());
   PRECONDITION(!strDestinationFile.IsEmpty());
   CString source = Paths::ToLongPath(strSourceFile);
   CString destination = Paths::ToLongPath(strDestinationFile);
   try {
-    // The file system decides whether both names are one file; names differing only in case
-    // are two files on a case-sensitive system.
-    if (Platform::GetFileAttributesW(destination) != INVALID_FILE_ATTRIBUTES && SameFile(source, destination)) return;
-    Directories::CreateDirectories(Directories::GetParentDirectory(destination));
+    if (createDirectory) Directories::CreateDirectories(Directories::GetParentDirectory(destination));
     if (!Platform::CopyFileW(source, destination, FALSE)) {
-      THROW_AT(LumoException::Win32ErrorCode(u"CopyFile", static_cast<int>(Platform::GetLastError())));
+      DWORD error = Platform::GetLastError();
+      // The platform refuses to copy a file onto itself. The file system decides whether both
+      // names are one file; names differing only in case are two files on a case-sensitive
+      // system, and are copied.
+      if (error == ERROR_SHARING_VIOLATION && SameFile(source, destination)) return;
+      THROW_AT(LumoException::Win32ErrorCode(u"CopyFile", static_cast<int>(error)));
     }
   } catch (LumoException::Exception& e) {
     THROW_AT(UnableToCopyFile(source.str(), destination.str(), e));
   }
+}
+
+}  // namespace
+
+void CopyFile(const CString& strSourceFile, const CString& strDestinationFile) {
+  Copy(strSourceFile, strDestinationFile, true);
 }
 
 bool Exists(const CString& strFile) {
@@ -314,6 +324,10 @@ CString RemoveExtension(const CString& strFileName) {
 }
 
 }  // namespace Files
+
+void FileSystemInternal::CopyFileInto(const CString& strSourceFile, const CString& strDestinationFile) {
+  Files::Copy(strSourceFile, strDestinationFile, false);
+}
 
 AutoDeleteFile::~AutoDeleteFile() {
   if (m_strPath.IsEmpty()) return;

@@ -11,6 +11,7 @@
 #include "owutils/Paths.h"
 #include "platform/Debug.h"
 #include "platform/FaultInjection.h"
+#include "platform/Errors.h"
 #include "platform/Files.h"
 
 using namespace FsTest;
@@ -245,4 +246,32 @@ TEST(Files, AutoDeleteFileDeletesAndNeverRaises) {
   { AutoDeleteFile missing(d / u"never-there"); }
   Platform::SetOutputHook(nullptr);
   EXPECT_NE(reported.find("Unable to delete file"), std::string::npos);
+}
+
+TEST(Files, TryFlavoursAnswerFalseUnderInjectedFailures) {
+  Folder d;
+  Write(d.Native("f"), "x");
+  {
+    FI::ScopedFault f("MoveFile", ERROR_DISK_FULL);
+    EXPECT_FALSE(Files::TryMoveFile(d / u"f", d / u"g"));
+  }
+  {
+    FI::ScopedFault f("MoveFile", ERROR_IO_DEVICE);
+    EXPECT_FALSE(Files::TryMoveFileEx(d / u"f", d / u"g", MOVEFILE_REPLACE_EXISTING));
+  }
+  {
+    FI::ScopedFault f("GetFileAttributes", ERROR_IO_DEVICE);
+    EXPECT_EQ(Files::TryGetAttributes(d / u"f"), INVALID_FILE_ATTRIBUTES);
+    EXPECT_EQ(Platform::GetLastError(), static_cast<DWORD>(ERROR_IO_DEVICE));  // left for the caller
+    FI::Arm("GetFileAttributes", ERROR_IO_DEVICE);
+    WIN32_FILE_ATTRIBUTE_DATA data{};
+    EXPECT_FALSE(Files::TryGetAttributesEx(d / u"f", data));
+    FI::Arm("GetFileAttributes", ERROR_IO_DEVICE);
+    EXPECT_FALSE(Files::Exists(d / u"f"));
+  }
+  {
+    FI::ScopedFault f("CreateFile", ERROR_ACCESS_DENIED);
+    EXPECT_TRUE(Files::IsInUse(d / u"f"));  // cannot tell a lock from a denial
+  }
+  EXPECT_EQ(Read(d.Native("f")), "x");
 }

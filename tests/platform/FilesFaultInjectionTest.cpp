@@ -55,3 +55,37 @@ TEST(FaultInjection, TableIsBounded) {
   EXPECT_TRUE(FI::Arm("X", 1));
   FI::Disarm();
 }
+
+// Run under the thread sanitizer in CI: the switch and the path mapping are used from several
+// threads at once while faults are armed and disarmed.
+#include <atomic>
+#include <string>
+#include <thread>
+#include <vector>
+
+#include "platform/PathMap.h"
+
+TEST(FaultInjectionConcurrency, ChecksRaceWithArmingWithoutLosingCounts) {
+  FI::Disarm();
+  std::atomic<bool> done{false};
+  std::atomic<unsigned> hits{0};
+  std::vector<std::thread> threads;
+  for (int t = 0; t < 3; ++t) {
+    threads.emplace_back([&] {
+      std::string native;
+      while (!done.load()) {
+        if (FI::Check("ReadFile")) hits.fetch_add(1);
+        Platform::MapToNative(u"C:\\a\\..\\b\\c", native);
+      }
+    });
+  }
+  for (int i = 0; i < 200; ++i) {
+    FI::Arm("ReadFile", ERROR_IO_DEVICE, 0, 5);
+    std::this_thread::yield();
+    FI::Disarm();
+  }
+  done = true;
+  for (auto& thread : threads) thread.join();
+  EXPECT_LE(hits.load(), 200u * 5u);
+  EXPECT_FALSE(FI::Check("ReadFile"));
+}
