@@ -119,6 +119,12 @@ ToolResult RunTool(std::vector<std::string> args, std::string input) {
   return RunTool(run);
 }
 
+std::map<std::string, std::string> WithLibraryDrive(std::map<std::string, std::string> env) {
+  const char* drives = std::getenv("OWUTILS_DRIVES");
+  env["OWUTILS_DRIVES"] = std::string(drives != nullptr ? drives : "") + ";Z=/";
+  return env;
+}
+
 bool PartMissing(const ToolResult& result) {
   return result.status == 1 && result.err.find("this build of the library has no") != std::string::npos;
 }

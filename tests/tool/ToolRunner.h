@@ -28,6 +28,10 @@ struct ToolRun {
 ToolResult RunTool(const ToolRun& run);
 ToolResult RunTool(std::vector<std::string> args, std::string input = std::string());
 
+// The test's drive map plus Z: for the whole file system, so that the library can name its own
+// folder (and find its resource modules beside it) while C: stays in the sandbox.
+std::map<std::string, std::string> WithLibraryDrive(std::map<std::string, std::string> env = {});
+
 // True when the tool answered that the library part behind a command is not in this build.
 bool PartMissing(const ToolResult& result);
 

@@ -86,7 +86,7 @@ bool IsHexText(const std::string& text) {
 Lumo::String LibraryPath(const std::string& nativePath) {
   Lumo::String native = Wide(nativePath, "the file name");
 #if defined(OWUTIL_HAVE_PATHS)
-  return Paths::FromNativePath(native);
+  return Lumo::String(Paths::FromNativePath(CString(native)).str());
 #else
   return native;
 #endif
@@ -241,7 +241,7 @@ void Progress::Draw(bool final) {
   char elapsed[32];
   std::snprintf(elapsed, sizeof elapsed, final ? " in %.1f s" : ", %.1f s", seconds);
   line += elapsed;
-  if ((counting || final) && seconds > 0.05 && done > 0) line += ", " + FormatBytes(done / seconds) + "/s";
+  if ((counting || final) && seconds > 0.0 && done > 0) line += ", " + FormatBytes(done / seconds) + "/s";
   if (final) line += "\n";
   std::fputs(line.c_str(), stderr);
   std::fflush(stderr);

@@ -187,12 +187,16 @@ void Resources(Steps& steps) {
   steps.Line("language: " + std::to_string(GetLanguageId()) + " " + CUtf8(GetLanguageIdString()));
   steps.Check(LoadEngineResources() && LoadAppResources(nullptr) && LoadLFResources() && LoadMessageResources(),
               "engine, application, LF and message modules loaded");
+  steps.Line("engine strings 1002 and 1004: '" + CUtf8(LVXSS_get(1002)) + "', '" + CUtf8(LVXSS_get(1004)) + "'");
 #if defined(OWUTIL_HAVE_FORMAT)
-  steps.Line("5368709120 bytes: " + CUtf8(FormatSize(5368709120LL)) + "; days in February 2024: " +
-             std::to_string(GetLastDayOfMonth(2, 2024)));
   CString message;
+  GetErrorMessage(0xE0001001, message);
+  steps.Check(!message.IsEmpty(), "message 0xE0001001 from the message module: " + CUtf8(message));
   GetErrorMessage(5, message);
-  steps.Line("error 5: " + CUtf8(message));
+  steps.Line("system error 5: " + CUtf8(message));
+  steps.Line("5368709120 bytes: " + CUtf8(FormatSize(5368709120LL)) + "; February 2024 has " +
+             std::to_string(GetLastDayOfMonth(2, 2024)) + " days; 1700000000 s after 1970: " +
+             CUtf8(FormatTime(1700000000)));
 #endif
 #else
   steps.Skip("resource modules");
@@ -214,7 +218,9 @@ int Demo(bool keep) {
   fs::path sandbox = MakeSandbox();
   // Before the library touches a store or a drive: everything goes into the sandbox.
   SetEnvironmentVariable("OWUTILS_STATE_DIR", (sandbox / "state").string());
-  SetEnvironmentVariable("OWUTILS_DRIVES", "C=" + (sandbox / "C").string());
+  // Drive C: is the sandbox; the rest of the file system stays reachable as drive Z:, where the
+  // library finds its resource modules.
+  SetEnvironmentVariable("OWUTILS_DRIVES", "C=" + (sandbox / "C").string() + ";Z=/");
   std::printf("sandbox: %s\n  OWUTILS_STATE_DIR=%s\n  OWUTILS_DRIVES=%s\n", sandbox.string().c_str(),
               GetEnvironmentVariable("OWUTILS_STATE_DIR").c_str(), GetEnvironmentVariable("OWUTILS_DRIVES").c_str());
 

@@ -198,7 +198,8 @@ int OemCommand(bool json) {
     PrintLine(out + "\n}");
   } else {
     PrintLine("version: " + fields[0].value + "." + fields[1].value + " build " + fields[2].value);
-    for (const OemField& field : fields) {
+    for (size_t i = 3; i < fields.size(); ++i) {
+      const OemField& field = fields[i];
       if (!field.number && field.value.empty()) continue;
       PrintLine(field.name + ": " + field.value);
     }
