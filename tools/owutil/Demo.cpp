@@ -43,6 +43,11 @@
 #include "owutils/LmOem.h"
 #define OWUTIL_HAVE_OEM 1
 #endif
+#if __has_include("owutils/Registry.h")
+#include "owutils/Registry.h"
+#define OWUTIL_HAVE_REGISTRY 1
+#endif
+#include "SourceLogger.h"  // OWUTIL_HAVE_EVENTLOG
 
 namespace owutil {
 namespace {
@@ -80,7 +85,7 @@ fs::path MakeSandbox() {
   return sandbox;
 }
 
-std::string ReadNative(const fs::path& path) {
+[[maybe_unused]] std::string ReadNative(const fs::path& path) {
   std::ifstream in(path, std::ios::binary);
   return std::string(std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>());
 }
@@ -153,6 +158,43 @@ void FileJob(Steps& steps, const fs::path& sandbox) {
 #endif
 }
 
+void EventLog(Steps& steps) {
+  steps.Step("Report an exception to the event log and read it back");
+#if defined(OWUTIL_HAVE_EVENTLOG)
+  SourceLogger logger(Lumo::String(u"OWUtilsDemo"), EngineMessageFile(), 0xC0000001);
+  steps.Line("event source 'OWUtilsDemo' registered in the sandbox's registry and event log");
+  try {
+    try {
+      THROW_AT(LumoException::Win32ErrorCode(u"CreateFile", 5));
+    } catch (LumoException::Exception& e) {
+      THROW_AT(UnableToOpenFile(u"C:\\report.txt", e));
+    }
+  } catch (LumoException::Exception& e) {
+    logger.ReportException(e, u"owutil demo");
+  }
+  logger.ReportStrings(4, 0x20002002, {u"Nightly", u"1,234", u"1.21 GB"}, 0, nullptr);
+  LumoException::EventLogger reader;
+  Lumo::StringList records;
+  DWORD next = 0;
+  reader.ReadEventLog(1, 10, true, records, next);
+  steps.Check(records.size() == 2, "two records read back from the Application log:");
+  for (const Lumo::String& record : records) {
+    std::string text = Utf8(record);
+    size_t start = 0;
+    while (start < text.size()) {
+      size_t end = text.find('\n', start);
+      if (end == std::string::npos) end = text.size();
+      std::string line = text.substr(start, end - start);
+      if (!line.empty() && line.back() == '\r') line.pop_back();
+      steps.Line("  " + line);
+      start = end + 1;
+    }
+  }
+#else
+  steps.Skip("event logger");
+#endif
+}
+
 void Codecs(Steps& steps) {
   steps.Step("Codecs");
 #if defined(OWUTIL_HAVE_BITCODECS)
@@ -182,9 +224,22 @@ void Codecs(Steps& steps) {
 }
 
 void Resources(Steps& steps) {
-  steps.Step("Language and resource modules");
+  steps.Step("Pick the language and load the resource modules");
 #if defined(OWUTIL_HAVE_RESOURCES)
-  steps.Line("language: " + std::to_string(GetLanguageId()) + " " + CUtf8(GetLanguageIdString()));
+  steps.Line("language from the environment: " + std::to_string(GetLanguageId()) + " " + CUtf8(GetLanguageIdString()));
+#if defined(OWUTIL_HAVE_REGISTRY)
+  // The product's registry value overrides the environment.
+  HKEY key = nullptr;
+  const DWORD german = 0x407;
+  bool set = Platform::RegCreateKeyExW(HKEY_LOCAL_MACHINE, u"Software\\Orbis Works\\Orbis Works Orbis Agent", 0, nullptr,
+                                       REG_OPTION_NON_VOLATILE, KEY_WRITE, nullptr, &key, nullptr) == 0 &&
+             Platform::RegSetValueExW(key, u"LanguageId", 0, REG_DWORD, reinterpret_cast<const BYTE*>(&german),
+                                      sizeof german) == 0;
+  if (key != nullptr) Platform::RegCloseKey(key);
+  steps.Check(set && GetLanguageId() == 0x407,
+              "LanguageId = 0x407 in the sandbox's registry: " + std::to_string(GetLanguageId()) + " " +
+                  CUtf8(GetLanguageIdString()));
+#endif
   steps.Check(LoadEngineResources() && LoadAppResources(nullptr) && LoadLFResources() && LoadMessageResources(),
               "engine, application, LF and message modules loaded");
   steps.Line("engine strings 1002 and 1004: '" + CUtf8(LVXSS_get(1002)) + "', '" + CUtf8(LVXSS_get(1004)) + "'");
@@ -228,6 +283,7 @@ int Demo(bool keep) {
   StringsAndExceptions(steps);
   SecretKey(steps);
   FileJob(steps, sandbox);
+  EventLog(steps);
   Codecs(steps);
   Resources(steps);
 

@@ -28,13 +28,13 @@ namespace {
 // compares. Its encType numbering is its own: 1-6 are the type codes 1-6, 7-11 are 9-13.
 constexpr const char16_t* kCheckText = u"harborlanternmeadowquietstoneelm";
 
-int ParseEncType(const std::string& text) {
+[[maybe_unused]] int ParseEncType(const std::string& text) {
   return static_cast<int>(ParseInteger(text, "ENCTYPE", 1, 11));
 }
 
-int TypeCodeOfEncType(int encType) { return encType <= 6 ? encType : encType + 2; }
+[[maybe_unused]] int TypeCodeOfEncType(int encType) { return encType <= 6 ? encType : encType + 2; }
 
-std::optional<std::uint64_t> NativeFileSize(const std::string& nativePath) {
+[[maybe_unused]] std::optional<std::uint64_t> NativeFileSize(const std::string& nativePath) {
   std::error_code error;
   std::uintmax_t size = std::filesystem::file_size(nativePath, error);
   if (error) return std::nullopt;

@@ -1,6 +1,7 @@
 // Store commands: eventlog write/read and registry get/set/delete.
 #include <cctype>
 #include <cstdio>
+#include <cstring>
 #include <memory>
 #include <string>
 #include <vector>
@@ -9,12 +10,11 @@
 #include "owutils/CString.h"
 #include "owutils/Exceptions.h"
 
-#if __has_include("owutils/EventLogger.h") && __has_include("owutils/LmResources.h") && \
-    __has_include("owutils/Application.h")
-#include "owutils/Application.h"
-#include "owutils/EventLogger.h"
-#include "owutils/LmResources.h"
-#define OWUTIL_HAVE_EVENTLOG 1
+#include "SourceLogger.h"  // defines OWUTIL_HAVE_EVENTLOG when the library has the event logger
+// The registry store, through the Win32-style calls of the library's public registry header.
+#if __has_include("owutils/Registry.h")
+#include "owutils/Registry.h"
+#define OWUTIL_HAVE_REGISTRY 1
 #endif
 
 namespace owutil {
@@ -47,7 +47,7 @@ struct RegistryOptions {
 };
 
 // Event-log types by name or number.
-WORD ParseEventType(const std::string& text) {
+[[maybe_unused]] WORD ParseEventType(const std::string& text) {
   static const std::vector<std::pair<std::string, WORD>> types = {
       {"error", 1}, {"warning", 2}, {"information", 4}, {"audit-success", 8}, {"audit-failure", 16}};
   std::string lower = text;
@@ -58,7 +58,7 @@ WORD ParseEventType(const std::string& text) {
   throw UsageError("unknown event type '" + text + "' (error, warning, information, audit-success, audit-failure)");
 }
 
-int ParseLog(const std::string& text) {
+[[maybe_unused]] int ParseLog(const std::string& text) {
   static const char* const logs[] = {"application", "security", "system"};
   std::string lower = text;
   for (char& c : lower) c = static_cast<char>(std::tolower(static_cast<unsigned char>(c)));
@@ -69,27 +69,6 @@ int ParseLog(const std::string& text) {
 }
 
 #if defined(OWUTIL_HAVE_EVENTLOG)
-// A logger that writes records as `source` and installs nothing: the library's default logger
-// stays the installed one.
-class SourceLogger : public LumoException::EventLogger {
- public:
-  SourceLogger(const Lumo::String& source, const Lumo::String& messageFile) : EventLogger(source.c_str(), nullptr) {
-    m_nMessageTargets = LumoException::ToEventLog;
-    m_strMessageFile = messageFile;
-    m_hEventSource = RegisterSource(source, messageFile);
-  }
-};
-
-// The engine resource module of the user's language: its message table formats the records
-// of the ids it holds.
-Lumo::String DefaultMessageFile() {
-  HINSTANCE module = nullptr;
-  CString name;
-  if (!LoadResourceModule(CString(u"EngineRes"), &module, name))
-    throw Failure("no message file: the engine resource module could not be loaded (give --message-file)");
-  return Lumo::String(Application::GetModulePath(module).str());
-}
-
 int EventLogWrite(const WriteOptions& options) {
   WORD type = ParseEventType(options.type);
   DWORD eventId = static_cast<DWORD>(ParseInteger(options.eventId, "--id", 0, UINT32_MAX));
@@ -98,7 +77,7 @@ int EventLogWrite(const WriteOptions& options) {
   Lumo::StringList strings;
   for (const std::string& text : options.texts) strings.push_back(Wide(text, "TEXT"));
   if (strings.size() > 16) throw UsageError("at most 16 texts make one record");
-  Lumo::String messageFile = options.messageFile.empty() ? DefaultMessageFile() : LibraryPath(options.messageFile);
+  Lumo::String messageFile = options.messageFile.empty() ? EngineMessageFile() : LibraryPath(options.messageFile);
   SourceLogger logger(source, messageFile);
   if (!logger.ReportStrings(type, eventId, strings, 0, nullptr)) throw Failure("the record could not be written");
   return 0;
@@ -124,9 +103,173 @@ int EventLogWrite(const WriteOptions&) { Missing("event logger"); }
 int EventLogRead(const ReadOptions&) { Missing("event logger"); }
 #endif
 
+#if defined(OWUTIL_HAVE_REGISTRY)
+// A key path from the command line: its hive and the path below it.
+struct KeyPath {
+  HKEY hive;
+  Lumo::String subKey;
+};
+
+KeyPath ParseKey(const std::string& text) {
+  static const std::vector<std::pair<std::string, HKEY>> hives = {
+      {"HKEY_LOCAL_MACHINE", HKEY_LOCAL_MACHINE}, {"HKLM", HKEY_LOCAL_MACHINE},
+      {"HKEY_CURRENT_USER", HKEY_CURRENT_USER},   {"HKCU", HKEY_CURRENT_USER}};
+  std::string head = text.substr(0, text.find('\\'));
+  std::string rest = head.size() < text.size() ? text.substr(head.size() + 1) : std::string();
+  for (char& c : head) c = static_cast<char>(std::toupper(static_cast<unsigned char>(c)));
+  for (const auto& [name, hive] : hives) {
+    if (head == name) return {hive, Wide(rest, "KEY")};
+  }
+  throw UsageError("KEY must start with its hive (HKEY_LOCAL_MACHINE\\..., HKLM\\..., HKEY_CURRENT_USER\\... or "
+                   "HKCU\\...), not '" + text + "'");
+}
+
+// An open key, closed at the end of the scope.
+class OpenKey {
+ public:
+  OpenKey() = default;
+  ~OpenKey() {
+    if (m_key != nullptr) Platform::RegCloseKey(m_key);
+  }
+  OpenKey(const OpenKey&) = delete;
+  OpenKey& operator=(const OpenKey&) = delete;
+  HKEY* Out() { return &m_key; }
+  HKEY Get() const { return m_key; }
+
+ private:
+  HKEY m_key = nullptr;
+};
+
+[[noreturn]] void RegistryFailure(LONG error, const std::string& what) {
+  if (error == 2) throw Failure(what + ": not found");
+  std::string text = Utf8(LumoException::SystemErrorText(static_cast<int>(error), false));
+  while (!text.empty() && (text.back() == '\n' || text.back() == '\r' || text.back() == ' ')) text.pop_back();
+  throw Failure(what + ": " + text + " (error " + std::to_string(error) + ")");
+}
+
+std::string ValueText(DWORD type, const std::vector<BYTE>& data) {
+  auto units = [&](size_t bytes) {
+    std::u16string text(bytes / 2, u'\0');
+    std::memcpy(text.data(), data.data(), text.size() * 2);
+    return text;
+  };
+  switch (type) {
+    case REG_SZ:
+    case REG_EXPAND_SZ: {
+      std::u16string text = units(data.size());
+      return Utf8(Lumo::String(text.c_str()));  // up to the terminator
+    }
+    case REG_MULTI_SZ: {
+      std::u16string text = units(data.size());
+      std::string lines;
+      for (size_t start = 0; start < text.size() && text[start] != 0;) {
+        size_t end = text.find(u'\0', start);
+        if (end == std::u16string::npos) end = text.size();
+        lines += (lines.empty() ? "" : "\n") + Utf8(Lumo::String(text.substr(start, end - start)));
+        start = end + 1;
+      }
+      return lines;
+    }
+    case REG_DWORD:
+      if (data.size() == 4) {
+        DWORD value;
+        std::memcpy(&value, data.data(), 4);
+        return std::to_string(value);
+      }
+      break;
+    case REG_QWORD:
+      if (data.size() == 8) {
+        std::uint64_t value;
+        std::memcpy(&value, data.data(), 8);
+        return std::to_string(value);
+      }
+      break;
+    default:
+      break;
+  }
+  static const char digits[] = "0123456789abcdef";
+  std::string hex;
+  for (BYTE b : data) {
+    hex += digits[b >> 4];
+    hex += digits[b & 15];
+  }
+  return hex;
+}
+
+int RegistryGet(const RegistryOptions& options) {
+  KeyPath path = ParseKey(options.key);
+  Lumo::String name = Wide(options.name, "NAME");
+  OpenKey key;
+  LONG error = Platform::RegOpenKeyExW(path.hive, path.subKey.c_str(), 0, KEY_READ, key.Out());
+  if (error != 0) RegistryFailure(error, options.key);
+  DWORD type = 0, size = 0;
+  std::vector<BYTE> data;
+  for (;;) {
+    error = Platform::RegQueryValueExW(key.Get(), name.c_str(), nullptr, &type, nullptr, &size);
+    if (error != 0) break;
+    data.resize(size);
+    error = Platform::RegQueryValueExW(key.Get(), name.c_str(), nullptr, &type, data.data(), &size);
+    if (error != 234) break;  // grown in between: ask again
+  }
+  if (error != 0) RegistryFailure(error, options.key + (options.name.empty() ? " (default value)" : ", " + options.name));
+  data.resize(size);
+  PrintLine(ValueText(type, data));
+  return 0;
+}
+
+int RegistrySet(const RegistryOptions& options) {
+  KeyPath path = ParseKey(options.key);
+  if (path.subKey.empty()) throw UsageError("KEY must name a key below its hive");
+  Lumo::String name = Wide(options.name, "NAME");
+  std::string type = options.type;
+  for (char& c : type) c = static_cast<char>(std::tolower(static_cast<unsigned char>(c)));
+  std::vector<BYTE> data;
+  DWORD regType;
+  if (type == "dword") {
+    regType = REG_DWORD;
+    DWORD value = static_cast<DWORD>(ParseInteger(options.value, "VALUE", INT32_MIN, UINT32_MAX));
+    data.resize(4);
+    std::memcpy(data.data(), &value, 4);
+  } else if (type == "sz") {
+    regType = REG_SZ;
+    Lumo::String text = Wide(options.value, "VALUE");
+    data.resize((text.size() + 1) * 2);
+    std::memcpy(data.data(), text.c_str(), data.size());
+  } else {
+    throw UsageError("--type must be sz or dword, not '" + options.type + "'");
+  }
+  OpenKey key;
+  DWORD disposition = 0;
+  LONG error = Platform::RegCreateKeyExW(path.hive, path.subKey.c_str(), 0, nullptr, REG_OPTION_NON_VOLATILE,
+                                         KEY_WRITE | KEY_QUERY_VALUE, nullptr, key.Out(), &disposition);
+  if (error != 0) RegistryFailure(error, options.key);
+  error = Platform::RegSetValueExW(key.Get(), name.c_str(), 0, regType, data.data(), static_cast<DWORD>(data.size()));
+  if (error != 0) RegistryFailure(error, options.key + ", " + options.name);
+  return 0;
+}
+
+int RegistryDelete(const RegistryOptions& options) {
+  KeyPath path = ParseKey(options.key);
+  if (options.name.empty()) {
+    if (path.subKey.empty()) throw UsageError("a hive cannot be deleted");
+    LONG error = Platform::RegDeleteKeyW(path.hive, path.subKey.c_str());
+    if (error == 5) throw Failure(options.key + ": the key has subkeys; delete them first");
+    if (error != 0) RegistryFailure(error, options.key);
+    return 0;
+  }
+  Lumo::String name = Wide(options.name, "NAME");
+  OpenKey key;
+  LONG error = Platform::RegOpenKeyExW(path.hive, path.subKey.c_str(), 0, KEY_SET_VALUE, key.Out());
+  if (error != 0) RegistryFailure(error, options.key);
+  error = Platform::RegDeleteValueW(key.Get(), name.c_str());
+  if (error != 0) RegistryFailure(error, options.key + ", " + options.name);
+  return 0;
+}
+#else
 int RegistryGet(const RegistryOptions&) { Missing("registry access"); }
 int RegistrySet(const RegistryOptions&) { Missing("registry access"); }
 int RegistryDelete(const RegistryOptions&) { Missing("registry access"); }
+#endif
 
 }  // namespace
 
