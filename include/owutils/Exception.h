@@ -114,6 +114,12 @@ class OWUTILS_API Exception {
   // Replaces the message with formatted text (Lumo::String::Format conventions).
   void FormatMessageText(const char16_t* format, ...);
 
+  // For exceptions re-created from another form (the XML exchange): appends `event` at the
+  // oldest end of the history exactly as given, and adopts the heap object `cause` as the cause
+  // (deleting it instead when there already is one). Both do nothing on a post-cloned exception.
+  void AppendHistoryEvent(const ExceptionEvent& event);
+  void AdoptCause(Exception* cause) noexcept;
+
  private:
   void RecordEvent(const char16_t* file, int line, std::int32_t kind);
 

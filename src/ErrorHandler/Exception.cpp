@@ -93,6 +93,19 @@ void Exception::RecordEvent(const char16_t* file, int line, std::int32_t kind) {
   m_pHistory->insert(m_pHistory->begin(), ExceptionEvent{ShortFileName(file), line, kind});
 }
 
+void Exception::AppendHistoryEvent(const ExceptionEvent& event) {
+  if (IsPostCloned()) return;
+  m_pHistory->push_back(event);
+}
+
+void Exception::AdoptCause(Exception* cause) noexcept {
+  if (m_pCause != nullptr || IsPostCloned()) {
+    delete cause;
+    return;
+  }
+  m_pCause = cause;
+}
+
 void Exception::RecordThrow(const char16_t* file, int line) { RecordEvent(file, line, Thrown); }
 void Exception::RecordCheckpoint(const char16_t* file, int line) { RecordEvent(file, line, Checkpointed); }
 

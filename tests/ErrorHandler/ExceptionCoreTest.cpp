@@ -5,6 +5,7 @@
 #include <mutex>
 #include <vector>
 
+#include "owutils/EventLogger.h"
 #include "owutils/Exceptions.h"
 #include "platform/Debug.h"
 #include "platform/Errors.h"
@@ -33,6 +34,17 @@ class DebugCapture {
  private:
   std::mutex m_mutex;
   std::vector<std::string> m_lines;
+};
+
+// Takes the installed event logger (the library's default one) out for one test, so that Report
+// takes its path for a process without a logger.
+class WithoutInstalledLogger : public LumoException::EventLogger {
+ public:
+  WithoutInstalledLogger() : m_saved(SetInstalledLogger(nullptr)) {}
+  ~WithoutInstalledLogger() override { SetInstalledLogger(m_saved); }
+
+ private:
+  EventLogger* m_saved;
 };
 
 std::vector<std::string> Lines(const Lumo::String& text) {
@@ -172,6 +184,7 @@ TEST(ExceptionCore, ShortFileName) {
 }
 
 TEST(ExceptionCore, ReportWithoutLoggerWritesToDebuggerOutput) {
+  WithoutInstalledLogger noLogger;
   DebugCapture capture;
   Exception e(u"lost");
   e.Report(u"context");
@@ -184,6 +197,7 @@ TEST(ExceptionCore, ReportWithoutLoggerWritesToDebuggerOutput) {
 }
 
 TEST(ExceptionCore, CatchAndReportReportsAndContinues) {
+  WithoutInstalledLogger noLogger;
   DebugCapture capture;
   int catchLine = 0;
   int tryLine = __LINE__ + 1;
