@@ -20,7 +20,7 @@
 namespace owutil {
 namespace {
 
-[[noreturn]] void Missing(const char* part) {
+[[maybe_unused]] [[noreturn]] void Missing(const char* part) {
   throw Failure(std::string("this build of the library has no ") + part);
 }
 
