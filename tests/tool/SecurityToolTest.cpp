@@ -91,6 +91,14 @@ TEST(ToolDigest, ProgressIsShownOnlyWhenStandardErrorIsATerminal) {
   EXPECT_THAT(result.err, HasSubstr("data.bin"));
   EXPECT_THAT(result.err, HasSubstr("3.0 MiB"));
   EXPECT_THAT(result.err, HasSubstr("/s"));
+
+  // The file commands show the same line; their results on standard output stay clean.
+  run.args = {"encrypt-file", "-t", "aes128", "-k", "k", file};
+  ToolResult encrypted = RunTool(run);
+  EXPECT_EQ(encrypted.status, 0);
+  EXPECT_EQ(encrypted.out, "");
+  EXPECT_THAT(encrypted.err, HasSubstr("data.bin"));
+  EXPECT_THAT(encrypted.err, HasSubstr("3.0 MiB in "));
 }
 
 TEST(ToolDigest, MissingFileFailsWithOneButTheOthersAreDigested) {
