@@ -9,11 +9,7 @@
 #include <iostream>
 
 #include "owutils/Exceptions.h"
-
-#if __has_include("owutils/Paths.h")
 #include "owutils/Paths.h"
-#define OWUTIL_HAVE_PATHS 1
-#endif
 
 namespace owutil {
 
@@ -85,11 +81,7 @@ bool IsHexText(const std::string& text) {
 
 Lumo::String LibraryPath(const std::string& nativePath) {
   Lumo::String native = Wide(nativePath, "the file name");
-#if defined(OWUTIL_HAVE_PATHS)
   return Lumo::String(Paths::FromNativePath(CString(native)).str());
-#else
-  return native;
-#endif
 }
 
 // --- Types -----------------------------------------------------------------------------------

@@ -5,38 +5,22 @@
 #include <vector>
 
 #include "Cli.h"
-#include "owutils/Exceptions.h"
-
-#if __has_include("owutils/BitCodecs.h")
 #include "owutils/BitCodecs.h"
-#define OWUTIL_HAVE_BITCODECS 1
-#endif
-#if __has_include("owutils/StringEncodeDecode.h")
+#include "owutils/Exceptions.h"
 #include "owutils/StringEncodeDecode.h"
-#define OWUTIL_HAVE_ENCODINGS 1
-#endif
 
 namespace owutil {
 namespace {
 
-[[maybe_unused]] [[noreturn]] void Missing(const char* part) {
-  throw Failure(std::string("this build of the library has no ") + part);
-}
-
 int HexEncode(const std::string& text) {
-#if defined(OWUTIL_HAVE_BITCODECS)
   Wide(text, "TEXT");  // the bytes must be text
   std::vector<char> out(2 * text.size() + 1);
   int n = BitsToAscii(reinterpret_cast<const unsigned char*>(text.data()), static_cast<int>(text.size()), out.data());
   PrintLine(std::string(out.data(), static_cast<size_t>(n)));
   return 0;
-#else
-  Missing("bit codecs");
-#endif
 }
 
 int HexDecode(const std::string& hex) {
-#if defined(OWUTIL_HAVE_BITCODECS)
   if (!hex.empty() && !IsHexText(hex)) throw UsageError("HEX must be hexadecimal digits, not '" + hex + "'");
   if (hex.size() % 2 != 0) throw UsageError("HEX must have an even number of digits");
   std::vector<unsigned char> out(hex.size() / 2 + 1);
@@ -44,27 +28,19 @@ int HexDecode(const std::string& hex) {
   std::fwrite(out.data(), 1, n, stdout);
   std::fputc('\n', stdout);
   return 0;
-#else
-  Missing("bit codecs");
-#endif
 }
 
 int Decimal(const std::string& text) {
-#if defined(OWUTIL_HAVE_BITCODECS)
   Wide(text, "TEXT");
   std::vector<char> out(3 * text.size() + 1);
   int n = BitsToDecimal(reinterpret_cast<const unsigned char*>(text.data()), static_cast<int>(text.size()), out.data());
   PrintLine(std::string(out.data(), static_cast<size_t>(n)));
   return 0;
-#else
-  Missing("bit codecs");
-#endif
 }
 
 enum class Encoding { Uri, Special };
 
 int Transcode(Encoding encoding, bool encode, const std::string& text) {
-#if defined(OWUTIL_HAVE_ENCODINGS)
   Lumo::String input = Wide(text, "TEXT");
   try {
     Lumo::String result;
@@ -80,9 +56,6 @@ int Transcode(Encoding encoding, bool encode, const std::string& text) {
     throw UsageError(message);
   }
   return 0;
-#else
-  Missing("text encodings");
-#endif
 }
 
 // Adds "GROUP encode TEXT" and "GROUP decode TEXT".

@@ -12,42 +12,22 @@
 #include <string>
 
 #include "Cli.h"
+#include "SourceLogger.h"
+#include "owutils/BitCodecs.h"
+#include "owutils/CEncrypt.h"
 #include "owutils/CString.h"
 #include "owutils/Exceptions.h"
-
-#if __has_include("owutils/CEncrypt.h")
-#include "owutils/CEncrypt.h"
-#define OWUTIL_HAVE_ENCRYPT 1
-#endif
-#if __has_include("owutils/SecretKey.h")
-#include "owutils/SecretKey.h"
-#define OWUTIL_HAVE_VERIFY 1
-#endif
-#if __has_include("owutils/BitCodecs.h")
-#include "owutils/BitCodecs.h"
-#define OWUTIL_HAVE_BITCODECS 1
-#endif
-#if __has_include("owutils/StringEncodeDecode.h")
-#include "owutils/StringEncodeDecode.h"
-#define OWUTIL_HAVE_ENCODINGS 1
-#endif
-#if __has_include("owutils/LmResources.h")
-#include "owutils/LmResources.h"
-#define OWUTIL_HAVE_RESOURCES 1
-#endif
-#if __has_include("owutils/LmFormat.h")
 #include "owutils/LmFormat.h"
-#define OWUTIL_HAVE_FORMAT 1
-#endif
-#if __has_include("owutils/LmOem.h")
 #include "owutils/LmOem.h"
-#define OWUTIL_HAVE_OEM 1
-#endif
+#include "owutils/LmResources.h"
+#include "owutils/SecretKey.h"
+#include "owutils/StringEncodeDecode.h"
+
+// The registry store is reached through the library's public registry calls where it has them.
 #if __has_include("owutils/Registry.h")
 #include "owutils/Registry.h"
 #define OWUTIL_HAVE_REGISTRY 1
 #endif
-#include "SourceLogger.h"  // OWUTIL_HAVE_EVENTLOG
 
 namespace owutil {
 namespace {
@@ -61,7 +41,6 @@ class Steps {
  public:
   void Step(const std::string& title) { std::printf("\n[%d] %s\n", ++m_count, title.c_str()); }
   void Line(const std::string& text) { std::printf("    %s\n", text.c_str()); }
-  void Skip(const std::string& what) { std::printf("    (skipped: this build has no %s yet)\n", what.c_str()); }
   void Check(bool ok, const std::string& what) {
     std::printf("    %s %s\n", ok ? "ok:    " : "FAILED:", what.c_str());
     if (!ok) m_failed = true;
@@ -116,7 +95,6 @@ void StringsAndExceptions(Steps& steps) {
 
 void SecretKey(Steps& steps) {
   steps.Step("Make and verify a secret-key code (AES-128, encType 9)");
-#if defined(OWUTIL_HAVE_ENCRYPT) && defined(OWUTIL_HAVE_VERIFY)
   const Lumo::String key(u"correct horse battery staple");
   CEncrypt aes(ENC_AES_128, TRUE, CString(key));
   CString code = aes.EncryptString(CString(u"harborlanternmeadowquietstoneelm"));
@@ -124,14 +102,10 @@ void SecretKey(Steps& steps) {
   steps.Check(VerifySecretKey(key, Lumo::String(code.str()), 9), "the key verifies against its code");
   steps.Check(!VerifySecretKey(Lumo::String(u"wrong key"), Lumo::String(code.str()), 9), "another key does not");
   steps.Check(!VerifySecretKey(key, Lumo::String(code.str()), 11), "nor the same key under AES-256");
-#else
-  steps.Skip("encryptor or VerifySecretKey");
-#endif
 }
 
 void FileJob(Steps& steps, const fs::path& sandbox) {
   steps.Step("Encrypt, decrypt and digest a file (C:\\report.txt, which lies in the sandbox)");
-#if defined(OWUTIL_HAVE_ENCRYPT)
   const std::string plain = "Quarterly report: 1,234 files protected, 0 lost.\nThe last 5 bytes stay plain: tail.";
   fs::path native = sandbox / "C" / "report.txt";
   std::ofstream(native, std::ios::binary) << plain;
@@ -152,15 +126,10 @@ void FileJob(Steps& steps, const fs::path& sandbox) {
   steps.Check(blowfish.DecryptFile(path) != FALSE && ReadNative(native) == plain, "decrypted: the file is back");
   steps.Check(sha.DigestFile(path) != FALSE && CUtf8(sha.GetDigestResultString()) == before, "and so is its digest");
   steps.Check(blowfish.EncryptFile(CString(u"C:\\missing.txt")) == FALSE, "a missing file fails without an exception");
-#else
-  (void)sandbox;
-  steps.Skip("encryptor");
-#endif
 }
 
 void EventLog(Steps& steps) {
   steps.Step("Report an exception to the event log and read it back");
-#if defined(OWUTIL_HAVE_EVENTLOG)
   SourceLogger logger(Lumo::String(u"OWUtilsDemo"), EngineMessageFile(), 0xC0000001);
   steps.Line("event source 'OWUtilsDemo' registered in the sandbox's registry and event log");
   try {
@@ -190,23 +159,15 @@ void EventLog(Steps& steps) {
       start = end + 1;
     }
   }
-#else
-  steps.Skip("event logger");
-#endif
 }
 
 void Codecs(Steps& steps) {
   steps.Step("Codecs");
-#if defined(OWUTIL_HAVE_BITCODECS)
   const unsigned char bytes[] = {0x0F, 0xA0, 0x07, 0xC8, 0xFF};
   char hex[2 * sizeof bytes + 1], decimal[3 * sizeof bytes + 1];
   BitsToAscii(bytes, sizeof bytes, hex);
   BitsToDecimal(bytes, sizeof bytes, decimal);
   steps.Line(std::string("bytes 0f a0 07 c8 ff as hex ") + hex + ", as decimal groups " + decimal);
-#else
-  steps.Skip("bit codecs");
-#endif
-#if defined(OWUTIL_HAVE_ENCODINGS)
   Lumo::String text(u"K\u00f6ln & co/2");
   Lumo::String uri = Lumo::EncodeURI(text.c_str()), special = Lumo::EncodeSpecialChars(text.c_str());
   steps.Line("'" + Utf8(text) + "' as URI: " + Utf8(uri) + ", with special characters escaped: " + Utf8(special));
@@ -218,14 +179,10 @@ void Codecs(Steps& steps) {
   } catch (LumoException::Exception& e) {
     steps.Check(true, "'%41' is refused: " + Utf8(e.GetMessage()));
   }
-#else
-  steps.Skip("text encodings");
-#endif
 }
 
 void Resources(Steps& steps) {
   steps.Step("Pick the language and load the resource modules");
-#if defined(OWUTIL_HAVE_RESOURCES)
   steps.Line("language from the environment: " + std::to_string(GetLanguageId()) + " " + CUtf8(GetLanguageIdString()));
 #if defined(OWUTIL_HAVE_REGISTRY)
   // The product's registry value overrides the environment.
@@ -243,7 +200,6 @@ void Resources(Steps& steps) {
   steps.Check(LoadEngineResources() && LoadAppResources(nullptr) && LoadLFResources() && LoadMessageResources(),
               "engine, application, LF and message modules loaded");
   steps.Line("engine strings 1002 and 1004: '" + CUtf8(LVXSS_get(1002)) + "', '" + CUtf8(LVXSS_get(1004)) + "'");
-#if defined(OWUTIL_HAVE_FORMAT)
   CString message;
   GetErrorMessage(0xE0001001, message);
   steps.Check(!message.IsEmpty(), "message 0xE0001001 from the message module: " + CUtf8(message));
@@ -252,11 +208,6 @@ void Resources(Steps& steps) {
   steps.Line("5368709120 bytes: " + CUtf8(FormatSize(5368709120LL)) + "; February 2024 has " +
              std::to_string(GetLastDayOfMonth(2, 2024)) + " days; 1700000000 s after 1970: " +
              CUtf8(FormatTime(1700000000)));
-#endif
-#else
-  steps.Skip("resource modules");
-#endif
-#if defined(OWUTIL_HAVE_OEM)
   auto info = std::make_unique<LM_OEM_INFO>();
   if (GetOEMDataTCHAR(info.get()) == 0) {
     steps.Line("OEM record: version " + std::to_string(info->dwMajorVersion) + "." +
@@ -265,7 +216,6 @@ void Resources(Steps& steps) {
   } else {
     steps.Check(false, "OEM record read from the engine module");
   }
-#endif
 }
 
 int Demo(bool keep) {

@@ -7,88 +7,48 @@
 
 #include "Cli.h"
 #include "owutils/CString.h"
-
-#if __has_include("owutils/LmFormat.h")
 #include "owutils/LmFormat.h"
-#define OWUTIL_HAVE_FORMAT 1
-#endif
-#if __has_include("owutils/LmResources.h")
-#include "owutils/LmResources.h"
-#define OWUTIL_HAVE_RESOURCES 1
-#endif
-#if __has_include("owutils/LmOem.h")
 #include "owutils/LmOem.h"
-#define OWUTIL_HAVE_OEM 1
-#endif
+#include "owutils/LmResources.h"
 
 namespace owutil {
 namespace {
-
-[[maybe_unused]] [[noreturn]] void Missing(const char* part) {
-  throw Failure(std::string("this build of the library has no ") + part);
-}
 
 [[maybe_unused]] std::string CUtf8(const CString& text) { return Utf8(Lumo::String(text.str())); }
 
 int FormatSizeCommand(const std::string& bytes) {
   std::int64_t value = ParseInteger(bytes, "BYTES", INT64_MIN, INT64_MAX);
-#if defined(OWUTIL_HAVE_FORMAT)
   PrintLine(CUtf8(FormatSize(value)));
   return 0;
-#else
-  (void)value;
-  Missing("size formatting");
-#endif
 }
 
 int FormatTimeCommand(const std::string& seconds) {
   std::int64_t value = ParseInteger(seconds, "SECONDS", INT64_MIN, INT64_MAX);
-#if defined(OWUTIL_HAVE_FORMAT)
   PrintLine(CUtf8(FormatTime(value)));
   return 0;
-#else
-  (void)value;
-  Missing("time formatting");
-#endif
 }
 
 int LastDayCommand(const std::string& month, const std::string& year) {
   int m = static_cast<int>(ParseInteger(month, "MONTH", 1, 12));
   int y = static_cast<int>(ParseInteger(year, "YEAR", 1, 9999));
-#if defined(OWUTIL_HAVE_FORMAT)
   PrintLine(std::to_string(GetLastDayOfMonth(m, y)));
   return 0;
-#else
-  (void)m;
-  (void)y;
-  Missing("calendar");
-#endif
 }
 
 int LanguageCommand() {
-#if defined(OWUTIL_HAVE_RESOURCES)
   PrintLine(std::to_string(GetLanguageId()) + " " + CUtf8(GetLanguageIdString()));
   return 0;
-#else
-  Missing("language selection");
-#endif
 }
 
 int ErrorTextCommand(const std::string& code) {
   std::int64_t value = ParseInteger(code, "CODE", INT32_MIN, UINT32_MAX);
-#if defined(OWUTIL_HAVE_FORMAT)
   CString text;
   GetErrorMessage(static_cast<unsigned long>(static_cast<std::uint32_t>(value)), text);
   if (text.IsEmpty()) throw Failure("no message text for code " + code);
   PrintLine(CUtf8(text));
   return 0;
-#else
-  (void)value;
-  Missing("error texts");
-#endif
 }
 
-#if defined(OWUTIL_HAVE_OEM)
 std::string JsonString(const std::string& text) {
   std::string out = "\"";
   for (unsigned char c : text) {
@@ -182,10 +142,8 @@ std::vector<OemField> OemFields(const LM_OEM_INFO& info) {
 #undef OW_TEXT_
   return fields;
 }
-#endif
 
 int OemCommand(bool json) {
-#if defined(OWUTIL_HAVE_OEM)
   auto info = std::make_unique<LM_OEM_INFO>();
   if (GetOEMDataTCHAR(info.get()) != 0) throw Failure("no OEM data: the engine resource module could not be loaded");
   std::vector<OemField> fields = OemFields(*info);
@@ -205,10 +163,6 @@ int OemCommand(bool json) {
     }
   }
   return 0;
-#else
-  (void)json;
-  Missing("OEM data");
-#endif
 }
 
 }  // namespace

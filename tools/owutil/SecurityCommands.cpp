@@ -6,23 +6,12 @@
 #include <vector>
 
 #include "Cli.h"
-#include "owutils/Exceptions.h"
-
-#if __has_include("owutils/CEncrypt.h")
 #include "owutils/CEncrypt.h"
-#define OWUTIL_HAVE_ENCRYPT 1
-#endif
-#if __has_include("owutils/SecretKey.h")
+#include "owutils/Exceptions.h"
 #include "owutils/SecretKey.h"
-#define OWUTIL_HAVE_VERIFY 1
-#endif
 
 namespace owutil {
 namespace {
-
-[[maybe_unused]] [[noreturn]] void Missing(const char* part) {
-  throw Failure(std::string("this build of the library has no ") + part);
-}
 
 // A secret-key code is the check text encrypted with the key; VerifySecretKey decrypts it and
 // compares. Its encType numbering is its own: 1-6 are the type codes 1-6, 7-11 are 9-13.
@@ -41,7 +30,6 @@ constexpr const char16_t* kCheckText = u"harborlanternmeadowquietstoneelm";
   return static_cast<std::uint64_t>(size);
 }
 
-#if defined(OWUTIL_HAVE_ENCRYPT)
 CString ToCString(const Lumo::String& text) { return CString(static_cast<const std::u16string&>(text)); }
 std::string CUtf8(const CString& text) { return Utf8(Lumo::String(text.str())); }
 
@@ -197,42 +185,10 @@ int VerifyKey(const CodeOptions& options) {
   int encType = ParseEncType(options.encType);
   if (!IsHexText(options.code)) throw UsageError("CODE must be hexadecimal digits, not '" + options.code + "'");
   Lumo::String key = options.key.Read();
-#if defined(OWUTIL_HAVE_VERIFY)
   bool valid = VerifySecretKey(key, Wide(options.code, "CODE"), encType);
-#else
-  (void)key;
-  (void)encType;
-  bool valid = false;
-  Missing("VerifySecretKey");
-#endif
   PrintLine(valid ? "valid" : "invalid");
   return valid ? 0 : 1;
 }
-#else
-int Types() { Missing("cipher catalogue"); }
-struct DigestOptions {
-  std::string type, text;
-  CLI::Option* textOption = nullptr;
-  std::vector<std::string> files;
-};
-int Digest(const DigestOptions&) { Missing("digests"); }
-struct CipherOptions {
-  std::string type;
-  KeyOptions key;
-  bool reduced = false;
-  std::vector<std::string> items;
-};
-int ProcessFiles(const CipherOptions&, bool) { Missing("file encryption"); }
-int EncryptString(const CipherOptions&) { Missing("encryptor"); }
-int DecryptString(const CipherOptions&) { Missing("encryptor"); }
-struct CodeOptions {
-  std::string encType;
-  KeyOptions key;
-  std::string code;
-};
-int MakeCode(const CodeOptions&) { Missing("encryptor"); }
-int VerifyKey(const CodeOptions&) { Missing("VerifySecretKey"); }
-#endif
 
 void AddCipherOptions(CLI::App* sub, CipherOptions& options, bool withReduced) {
   sub->add_option("-t,--type", options.type, "cipher: code 1-13 or " + TypeNames(false))->required()->type_name("TYPE");

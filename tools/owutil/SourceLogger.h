@@ -2,13 +2,10 @@
 // default logger stays the installed one (a second installed logger is refused).
 #pragma once
 
-#if __has_include("owutils/EventLogger.h") && __has_include("owutils/LmResources.h") && \
-    __has_include("owutils/Application.h")
 #include "Cli.h"
 #include "owutils/Application.h"
 #include "owutils/EventLogger.h"
 #include "owutils/LmResources.h"
-#define OWUTIL_HAVE_EVENTLOG 1
 
 namespace owutil {
 
@@ -37,4 +34,3 @@ inline Lumo::String EngineMessageFile() {
 }
 
 }  // namespace owutil
-#endif

@@ -7,10 +7,10 @@
 #include <vector>
 
 #include "Cli.h"
+#include "SourceLogger.h"
 #include "owutils/CString.h"
 #include "owutils/Exceptions.h"
 
-#include "SourceLogger.h"  // defines OWUTIL_HAVE_EVENTLOG when the library has the event logger
 // The registry store, through the Win32-style calls of the library's public registry header.
 #if __has_include("owutils/Registry.h")
 #include "owutils/Registry.h"
@@ -68,7 +68,6 @@ struct RegistryOptions {
   throw UsageError("unknown log '" + text + "' (Application, Security or System)");
 }
 
-#if defined(OWUTIL_HAVE_EVENTLOG)
 int EventLogWrite(const WriteOptions& options) {
   WORD type = ParseEventType(options.type);
   DWORD eventId = static_cast<DWORD>(ParseInteger(options.eventId, "--id", 0, UINT32_MAX));
@@ -98,10 +97,6 @@ int EventLogRead(const ReadOptions& options) {
   }
   return 0;
 }
-#else
-int EventLogWrite(const WriteOptions&) { Missing("event logger"); }
-int EventLogRead(const ReadOptions&) { Missing("event logger"); }
-#endif
 
 #if defined(OWUTIL_HAVE_REGISTRY)
 // A key path from the command line: its hive and the path below it.
