@@ -26,7 +26,9 @@ TEST(ToolCli, EveryCommandHasHelp) {
   ToolResult top = RunTool({"--help"});
   EXPECT_EQ(top.status, 0);
   for (const auto& command : kEveryCommand) {
-    if (command.size() == 1) EXPECT_THAT(top.out, HasSubstr("  " + command[0] + " ")) << command[0];
+    if (command.size() == 1) {
+      EXPECT_THAT(top.out, HasSubstr("  " + command[0] + " ")) << command[0];
+    }
     std::vector<std::string> args = command;
     args.push_back("--help");
     ToolResult help = RunTool(args);

@@ -27,7 +27,9 @@ void ExpectCases(const std::vector<Case>& cases) {
     for (const auto& a : c.args) line += a + " ";
     EXPECT_EQ(result.status, c.status) << line << result.err;
     EXPECT_EQ(result.out, c.out) << line;
-    if (c.status == 2) EXPECT_THAT(result.err, HasSubstr("owutil: ")) << line;
+    if (c.status == 2) {
+      EXPECT_THAT(result.err, HasSubstr("owutil: ")) << line;
+    }
   }
 }
 
