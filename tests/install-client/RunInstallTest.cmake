@@ -35,18 +35,25 @@ foreach(file
     message(FATAL_ERROR "not installed: ${file}")
   endif()
 endforeach()
-file(GLOB modules ${prefix}/${LIBDIR}/OW*Res409.so ${prefix}/${LIBDIR}/OW*Msg409.so)
-message(STATUS "resource modules installed: ${modules}")
+# The resource modules lie beside the library, in English and German.
+foreach(module AppRes EngineRes LFRes AppMsg)
+  foreach(language 409 407)
+    if(NOT EXISTS ${prefix}/${LIBDIR}/OW${module}${language}.so)
+      message(FATAL_ERROR "resource module not installed beside the library: OW${module}${language}.so")
+    endif()
+  endforeach()
+endforeach()
 
 # The installed tool runs from the installed tree (its library found through its run path).
 run(${prefix}/bin/owutil --help)
 expect_match("${out}" "Usage: owutil" "owutil --help")
-if(EXISTS ${prefix}/include/owutils/CEncrypt.h)
-  run(${prefix}/bin/owutil types)
-  expect_match("${out}" "\n13 +aes256 +256 +16 +256-bit AES\n" "owutil types")
-  run(${prefix}/bin/owutil digest --string abc)
-  expect_match("${out}" "^a9993e364706816aba3e25717850c26c9cd0d89d\n$" "owutil digest")
-endif()
+run(${prefix}/bin/owutil types)
+expect_match("${out}" "\n13 +aes256 +256 +16 +256-bit AES\n" "owutil types")
+run(${prefix}/bin/owutil digest --string abc)
+expect_match("${out}" "^a9993e364706816aba3e25717850c26c9cd0d89d\n$" "owutil digest")
+# The installed library finds the installed modules beside it (default drive map C=/).
+run(${CMAKE_COMMAND} -E env --unset=OWUTILS_DRIVES ${prefix}/bin/owutil oem)
+expect_match("${out}" "^version: [0-9]+\\.[0-9]+ build [0-9]+\n" "owutil oem")
 
 set(configure ${CMAKE_COMMAND} -S ${SOURCE_DIR} -B ${WORK_DIR}/build -G ${GENERATOR}
   -DCMAKE_PREFIX_PATH=${prefix} -DCMAKE_BUILD_TYPE=Release)
@@ -60,7 +67,8 @@ run(${configure})
 run(${CMAKE_COMMAND} --build ${WORK_DIR}/build)
 foreach(client client client_pkgconfig)
   run(${WORK_DIR}/build/${client})
-  expect_match("${out}" "^client 19\ncaught PreconditionFailed0\n" "${client}")
+  expect_match("${out}" "^client 19\ncaught PreconditionFailed0\nsha1\\(abc\\) a9993e364706816aba3e25717850c26c9cd0d89d\n$"
+    "${client}")
   message(STATUS "${client}: ${out}")
 endforeach()
 file(REMOVE_RECURSE ${WORK_DIR})

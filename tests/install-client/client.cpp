@@ -2,11 +2,9 @@
 // and catches one of the library's exceptions across the library boundary, and digests a text.
 #include <cstdio>
 
+#include "owutils/CEncrypt.h"
 #include "owutils/Exceptions.h"
 #include "owutils/tstring.h"
-#if __has_include("owutils/CEncrypt.h")
-#include "owutils/CEncrypt.h"
-#endif
 
 int main() {
   Lumo::String text;
@@ -17,10 +15,8 @@ int main() {
   } catch (LumoException::PreconditionFailed0& e) {
     std::printf("caught %s\n", Lumo::String(e.GetType().name).ToUtf8().Get());
   }
-#if __has_include("owutils/CEncrypt.h")
   CEncrypt sha(DIGEST_SHA1, TRUE);
   sha.DigestString(CString(u"abc"));
   std::printf("sha1(abc) %s\n", Lumo::String(sha.GetDigestResultString().str()).ToUtf8().Get());
-#endif
   return 0;
 }
