@@ -95,14 +95,14 @@ bool ReadStringValue(HKEY key, const char16_t* name, size_t maxUnits, Lumo::Stri
   return !value.empty();
 }
 
-// Message modules are loaded as data files through the platform's module loader.
+constexpr DWORD kDontResolveDllReferences = 0x00000001;  // DONT_RESOLVE_DLL_REFERENCES
+
+// Message modules are loaded as data files: for their message tables, running none of their code.
 HMODULE LoadMessageModule(const Lumo::String& path) {
-  (void)path;
-  Platform::SetLastError(ERROR_MOD_NOT_FOUND);
-  return nullptr;
+  return Platform::LoadLibraryExW(path.c_str(), nullptr, kDontResolveDllReferences | Platform::kLoadLibraryAsDatafile);
 }
 
-void FreeMessageModule(HMODULE module) { (void)module; }
+void FreeMessageModule(HMODULE module) { Platform::FreeLibrary(module); }
 
 // The message module of a log's source, located through the source's registry key: its
 // "EventMessageFile", or the "MessageFileName" of the publisher its "ProviderGuid" names.

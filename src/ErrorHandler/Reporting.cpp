@@ -34,4 +34,11 @@ void ReportWarningToEventHandler(const char16_t* text) noexcept {
   }
 }
 
+void ReportWarningToEventHandler(DWORD eventId, const char16_t* text) noexcept {
+  try {
+    if (EventLogger* logger = EventHandler()) logger->ReportMessage(kWarning, eventId, u"%1", text == nullptr ? u"" : text);
+  } catch (...) {
+  }
+}
+
 }  // namespace LumoException::detail

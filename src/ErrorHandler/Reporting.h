@@ -12,6 +12,7 @@
 #pragma once
 
 #include "owutils/Exception.h"
+#include "owutils/WinTypes.h"
 
 namespace LumoException::detail {
 
@@ -26,5 +27,7 @@ void ReportToEventHandler(const Exception& e, const char16_t* text) noexcept;
 // type 2). The text is the single insert of the template "%1", so it reaches the log unchanged.
 // Skips the report when a caller has deleted that entry.
 void ReportWarningToEventHandler(const char16_t* text) noexcept;
+// The same with an event id of the caller's (the one above uses the logger's default id).
+void ReportWarningToEventHandler(DWORD eventId, const char16_t* text) noexcept;
 
 }  // namespace LumoException::detail

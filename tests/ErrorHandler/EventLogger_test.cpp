@@ -362,6 +362,100 @@ TEST_F(EventLoggerTest, ReadEventLogPagesInBothDirections) {
   EXPECT_TRUE(records.empty());
 }
 
+// The shipped English message module, copied onto drive C of the test's drive map.
+bool InstallMessageModule(const char16_t*& windowsPath) {
+  std::error_code error;
+  const auto exe = std::filesystem::read_symlink("/proc/self/exe", error);
+  if (error) return false;
+  const auto module = exe.parent_path().parent_path() / "lib" / "OWAppMsg409.so";
+  if (!std::filesystem::exists(module)) return false;
+  std::filesystem::create_directories(OwTest::SandboxDirectory() + "/drive-c/Messages");
+  std::filesystem::copy_file(module, OwTest::SandboxDirectory() + "/drive-c/Messages/OWAppMsg409.so",
+                             std::filesystem::copy_options::overwrite_existing, error);
+  windowsPath = u"C:\\Messages\\OWAppMsg409.so";
+  return !error;
+}
+
+TEST_F(EventLoggerTest, MessagesOfTheSourcesMessageModule) {
+  const char16_t* messageFile = nullptr;
+  if (!InstallMessageModule(messageFile)) GTEST_SKIP() << "the message module is not built";
+  class ModuleLogger : public TestLogger {
+   public:
+    ModuleLogger(const char16_t* file) : TestLogger(0, LumoException::ToEventLog | LumoException::ToDebugger) {
+      m_strSourceName = u"OWWithMessages";
+      m_strMessageFile = file;
+      m_hEventSource = RegisterSource(m_strSourceName, m_strMessageFile);
+    }
+  } logger(messageFile);
+  Capture capture;
+  // The message takes one insert; a second one is ignored, a missing one reads as empty.
+  ASSERT_TRUE(logger.ReportStrings(1, 0xE0001002, {u"D:\\", u"unused"}, 0, nullptr));
+  ASSERT_TRUE(logger.ReportStrings(1, 0xE0001004, {}, 0, nullptr));
+  ASSERT_TRUE(logger.ReportStrings(1, 0x12345, {u"no such message"}, 0, nullptr));
+  ASSERT_EQ(capture.debug.size(), 3u);
+  EXPECT_EQ(capture.debug[0], u"There is not enough free space on D:\\.\r\n");
+  EXPECT_EQ(capture.debug[1], u"The connection to the server  was lost.\r\n");
+  EXPECT_EQ(capture.debug[2], u"no such message");
+
+  Lumo::StringList records;
+  DWORD next = 0;
+  logger.ReadEventLog(1, 10, true, records, next);
+  ASSERT_EQ(records.size(), 3u);
+  EXPECT_TRUE(Contains(records[0], u" - Error]\nThere is not enough free space on D:\\.\r\n")) << OwTest::Narrow(records[0]);
+  EXPECT_TRUE(Contains(records[2], u" - Error]\nno such message"));
+
+  // A source that names its publisher instead of a message file.
+  HKEY key = nullptr;
+  ASSERT_EQ(Platform::RegCreateKeyExW(HKEY_LOCAL_MACHINE,
+                                      u"SYSTEM\\CurrentControlSet\\Services\\EventLog\\Application\\OWPublished", 0,
+                                      nullptr, 0, KEY_ALL_ACCESS, nullptr, &key, nullptr),
+            ERROR_SUCCESS);
+  const char16_t guid[] = u"{6B1A3F2E-0000-4000-8000-000000000001}";
+  Platform::RegSetValueExW(key, u"ProviderGuid", 0, REG_SZ, reinterpret_cast<const BYTE*>(guid), sizeof guid);
+  Platform::RegCloseKey(key);
+  ASSERT_EQ(Platform::RegCreateKeyExW(HKEY_LOCAL_MACHINE,
+                                      u"SOFTWARE\\Microsoft\\Windows\\CurrentVersion\\WINEVT\\Publishers\\"
+                                      u"{6B1A3F2E-0000-4000-8000-000000000001}",
+                                      0, nullptr, 0, KEY_ALL_ACCESS, nullptr, &key, nullptr),
+            ERROR_SUCCESS);
+  const std::u16string file(messageFile);
+  Platform::RegSetValueExW(key, u"MessageFileName", 0, REG_EXPAND_SZ, reinterpret_cast<const BYTE*>(file.c_str()),
+                           static_cast<DWORD>((file.size() + 1) * 2));
+  Platform::RegCloseKey(key);
+  HANDLE source = Platform::RegisterEventSourceW(nullptr, u"OWPublished");
+  const char16_t* strings[] = {u"E:\\"};
+  ASSERT_TRUE(Platform::ReportEventW(source, 2, 0, 0xE0001002, nullptr, 1, 0, strings, nullptr));
+  Platform::DeregisterEventSource(source);
+  logger.ReadEventLog(1, 10, true, records, next);
+  ASSERT_EQ(records.size(), 1u);
+  EXPECT_TRUE(Contains(records[0], u"[OWPublished - "));
+  EXPECT_TRUE(Contains(records[0], u" - Warning]\nThere is not enough free space on E:\\.\r\n"));
+}
+
+TEST_F(EventLoggerTest, WarningsWithAnEventIdReachTheRegisteredLogger) {
+  TestLogger logger(0, LumoException::ToEventLog, u"OWWarnings");
+  void* handler = LmObjectGet(u"LM_EVENT_HANDLER");
+  ASSERT_TRUE(LmObjectAdd(u"LM_EVENT_HANDLER", static_cast<EventLogger*>(&logger)));
+  LumoException::detail::ReportWarningToEventHandler(0x40001234, u"Crash reporting: 50% of %1");
+  LumoException::detail::ReportWarningToEventHandler(u"plain");
+  ASSERT_TRUE(LmObjectAdd(u"LM_EVENT_HANDLER", handler));
+
+  HANDLE log = Platform::OpenEventLogW(nullptr, u"Application");
+  std::vector<BYTE> buffer(4096);
+  DWORD read = 0, needed = 0;
+  ASSERT_TRUE(Platform::ReadEventLogW(log, EVENTLOG_SEQUENTIAL_READ | EVENTLOG_FORWARDS_READ, 0, buffer.data(), 4096,
+                                      &read, &needed));
+  Platform::CloseEventLog(log);
+  EVENTLOGRECORD first, second;
+  std::memcpy(&first, buffer.data(), sizeof first);
+  std::memcpy(&second, buffer.data() + first.Length, sizeof second);
+  EXPECT_EQ(first.EventID, 0x40001234u);
+  EXPECT_EQ(first.EventType, 2);
+  EXPECT_EQ(std::u16string(reinterpret_cast<const char16_t*>(buffer.data() + first.StringOffset)),
+            u"Crash reporting: 50% of %1 \r\n");
+  EXPECT_EQ(second.EventID, 0xC0000000u);
+}
+
 TEST_F(EventLoggerTest, DamagedStoreIsAnEventLogFailure) {
   {
     std::ofstream garbage(m_dir + "/eventlog.db", std::ios::binary);

@@ -13,6 +13,8 @@
 #include <thread>
 #include <vector>
 
+#include <sqlite3.h>
+
 #include "platform/Errors.h"
 #include "platform/EventLog.h"
 #include "platform/Registry.h"
@@ -303,4 +305,30 @@ TEST_F(EventLogTest, DamagedOrUnreadableStoreFailsWithCode) {
     EXPECT_EQ(OpenEventLogW(nullptr, u"Application"), nullptr);
     EXPECT_EQ(GetLastError(), static_cast<DWORD>(ERROR_ACCESS_DENIED));
   }
+}
+
+TEST_F(EventLogTest, TamperedRecordIsReportedNotWalkedPast) {
+  HANDLE source = RegisterEventSourceW(nullptr, u"OWTest");
+  ASSERT_TRUE(Write(source, 1, {u"good"}));
+  ASSERT_TRUE(Write(source, 2, {u"to be damaged", u"second"}));
+  DeregisterEventSource(source);
+  // Another program rewrites the second record's strings without their terminators.
+  sqlite3* db = nullptr;
+  ASSERT_EQ(sqlite3_open((m_dir + "/eventlog.db").c_str(), &db), SQLITE_OK);
+  sqlite3_busy_timeout(db, 5000);
+  EXPECT_EQ(sqlite3_exec(db, "UPDATE event_records SET strings = x'41004200' WHERE number = 2", nullptr, nullptr, nullptr),
+            SQLITE_OK);
+  sqlite3_close(db);
+
+  HANDLE log = OpenEventLogW(nullptr, u"Application");
+  ASSERT_NE(log, nullptr);
+  std::vector<BYTE> buffer(4096);
+  DWORD read = 0, needed = 0;
+  // The sound record before the damaged one is delivered; the damaged one is an error.
+  ASSERT_TRUE(ReadEventLogW(log, EVENTLOG_SEQUENTIAL_READ | EVENTLOG_FORWARDS_READ, 0, buffer.data(), 4096, &read, &needed));
+  EXPECT_EQ(Parse(buffer.data()).strings, std::vector<std::u16string>{u"good"});
+  EXPECT_EQ(read, Parse(buffer.data()).number == 1 ? reinterpret_cast<EVENTLOGRECORD*>(buffer.data())->Length : 0u);
+  EXPECT_FALSE(ReadEventLogW(log, EVENTLOG_SEQUENTIAL_READ | EVENTLOG_FORWARDS_READ, 0, buffer.data(), 4096, &read, &needed));
+  EXPECT_EQ(GetLastError(), static_cast<DWORD>(ERROR_EVENTLOG_FILE_CORRUPT));
+  CloseEventLog(log);
 }

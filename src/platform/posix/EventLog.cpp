@@ -233,7 +233,17 @@ void WriteRecord(const Row& row, BYTE* out, size_t size) {
   std::memcpy(out + size - sizeof(DWORD), &length, sizeof length);
 }
 
-void ReadRow(const Statement& q, Row& row) {
+// A stored record must be one the writer could have made: its insertion strings exactly
+// `count` NUL-terminated strings. Anything else is damage, which a reader must not walk past.
+bool RowIsSound(const Row& row) {
+  size_t terminators = 0;
+  for (char16_t c : row.strings) terminators += c == 0 ? 1 : 0;
+  if (terminators != row.count) return false;
+  if (!row.strings.empty() && row.strings.back() != 0) return false;
+  return RecordSize(row) <= kMaxRecordSize && row.number > 0 && row.number <= 0xFFFFFFFFll;
+}
+
+bool ReadRow(const Statement& q, Row& row) {
   row.number = q.Int(0);
   row.generated = static_cast<DWORD>(q.Int(1));
   row.written = static_cast<DWORD>(q.Int(2));
@@ -247,6 +257,7 @@ void ReadRow(const Statement& q, Row& row) {
   size_t size = 0;
   const void* data = q.Blob(10, size);
   row.data.assign(static_cast<const BYTE*>(data), static_cast<const BYTE*>(data) + size);
+  return RowIsSound(row);
 }
 
 constexpr const char* kSelectForwards =
@@ -404,7 +415,11 @@ BOOL ReadEventLogW(HANDLE log, DWORD flags, DWORD recordOffset, void* buffer, DW
       int rc = q.Step();
       if (rc == SQLITE_DONE) break;
       if (rc != SQLITE_ROW) return store.Error(rc);
-      ReadRow(q, row);
+      if (!ReadRow(q, row)) {
+        // The records before a damaged one are delivered; the damage is the next read's answer.
+        if (first) return static_cast<DWORD>(ERROR_EVENTLOG_FILE_CORRUPT);
+        break;
+      }
       if (first && seek && row.number != start) return static_cast<DWORD>(ERROR_INVALID_PARAMETER);
       const size_t size = RecordSize(row);
       if (written + size > bytesToRead) {
