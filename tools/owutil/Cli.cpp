@@ -24,6 +24,8 @@ std::string Utf8(const Lumo::String& text) {
   return utf8.Get() != nullptr ? std::string(utf8.Get()) : std::string();
 }
 
+std::string CUtf8(const CString& text) { return Utf8(Lumo::String(text.str())); }
+
 Lumo::String Wide(const std::string& text, const char* what) {
   Lumo::String wide;
   try {

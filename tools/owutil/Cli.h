@@ -20,6 +20,7 @@
 #include <thread>
 #include <vector>
 
+#include "owutils/CString.h"
 #include "owutils/tstring.h"
 
 namespace owutil {
@@ -45,6 +46,7 @@ struct Commands {
 
 // --- Text ------------------------------------------------------------------------------------
 std::string Utf8(const Lumo::String& text);
+std::string CUtf8(const CString& text);
 // Strict UTF-8 from the command line; invalid bytes are bad input naming `what`.
 Lumo::String Wide(const std::string& text, const char* what);
 // Writes `text` and a line end to standard output.

@@ -34,8 +34,6 @@ namespace {
 
 namespace fs = std::filesystem;
 
-[[maybe_unused]] std::string CUtf8(const CString& text) { return Utf8(Lumo::String(text.str())); }
-
 // Prints one step: "  [n] title" and its result lines indented below.
 class Steps {
  public:
@@ -64,7 +62,7 @@ fs::path MakeSandbox() {
   return sandbox;
 }
 
-[[maybe_unused]] std::string ReadNative(const fs::path& path) {
+std::string ReadNative(const fs::path& path) {
   std::ifstream in(path, std::ios::binary);
   return std::string(std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>());
 }

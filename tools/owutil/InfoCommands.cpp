@@ -14,8 +14,6 @@
 namespace owutil {
 namespace {
 
-[[maybe_unused]] std::string CUtf8(const CString& text) { return Utf8(Lumo::String(text.str())); }
-
 int FormatSizeCommand(const std::string& bytes) {
   std::int64_t value = ParseInteger(bytes, "BYTES", INT64_MIN, INT64_MAX);
   PrintLine(CUtf8(FormatSize(value)));

@@ -17,13 +17,13 @@ namespace {
 // compares. Its encType numbering is its own: 1-6 are the type codes 1-6, 7-11 are 9-13.
 constexpr const char16_t* kCheckText = u"harborlanternmeadowquietstoneelm";
 
-[[maybe_unused]] int ParseEncType(const std::string& text) {
+int ParseEncType(const std::string& text) {
   return static_cast<int>(ParseInteger(text, "ENCTYPE", 1, 11));
 }
 
-[[maybe_unused]] int TypeCodeOfEncType(int encType) { return encType <= 6 ? encType : encType + 2; }
+int TypeCodeOfEncType(int encType) { return encType <= 6 ? encType : encType + 2; }
 
-[[maybe_unused]] std::optional<std::uint64_t> NativeFileSize(const std::string& nativePath) {
+std::optional<std::uint64_t> NativeFileSize(const std::string& nativePath) {
   std::error_code error;
   std::uintmax_t size = std::filesystem::file_size(nativePath, error);
   if (error) return std::nullopt;
@@ -31,8 +31,6 @@ constexpr const char16_t* kCheckText = u"harborlanternmeadowquietstoneelm";
 }
 
 CString ToCString(const Lumo::String& text) { return CString(static_cast<const std::u16string&>(text)); }
-std::string CUtf8(const CString& text) { return Utf8(Lumo::String(text.str())); }
-
 int Types() {
   std::printf("%-4s  %-10s  %8s  %5s  %s\n", "CODE", "NAME", "KEY_BITS", "BLOCK", "DISPLAY_NAME");
   for (const TypeInfo& type : TypeTable()) {

@@ -47,7 +47,7 @@ struct RegistryOptions {
 };
 
 // Event-log types by name or number.
-[[maybe_unused]] WORD ParseEventType(const std::string& text) {
+WORD ParseEventType(const std::string& text) {
   static const std::vector<std::pair<std::string, WORD>> types = {
       {"error", 1}, {"warning", 2}, {"information", 4}, {"audit-success", 8}, {"audit-failure", 16}};
   std::string lower = text;
@@ -58,7 +58,7 @@ struct RegistryOptions {
   throw UsageError("unknown event type '" + text + "' (error, warning, information, audit-success, audit-failure)");
 }
 
-[[maybe_unused]] int ParseLog(const std::string& text) {
+int ParseLog(const std::string& text) {
   static const char* const logs[] = {"application", "security", "system"};
   std::string lower = text;
   for (char& c : lower) c = static_cast<char>(std::tolower(static_cast<unsigned char>(c)));
