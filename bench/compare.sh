@@ -79,7 +79,11 @@ if [[ -f bench/FileSystem/compare_tree.sh && -x $BUILD/bench/bench_tree_bench ]]
     awk '
       $(NF - 1) == "ratio" {
         split($0, parts, / +[0-9.]+ s +/)
-        printf "| FileSystem | %s / %s | %s | time, <= 1.0 |\n", $1, parts[2], $NF
+        peer = parts[2]
+        gsub(/\|/, "\\|", peer)   # a pipe of the peer command would split the Markdown cell
+        ratio = $NF
+        if (ratio ~ /^\./) ratio = "0" ratio
+        printf "| FileSystem | %s / %s | %s | time, <= 1.0 |\n", $1, peer, ratio
       }' <<<"$OUTPUT" >> "$ROWS"
   fi
 fi
