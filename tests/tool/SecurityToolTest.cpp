@@ -144,9 +144,10 @@ TEST(ToolFiles, ReducedStrengthIsADifferentKey) {
 TEST(ToolFiles, AnyFailingFileGivesExitOne) {
   std::string dir = MakeTempDirectory();
   std::string good = WriteFile(dir + "/good", std::string(32, 'g'));
-  ToolResult result = RunTool({"encrypt-file", "-t", "aes128", "-k", "k", dir + "/missing", good});
+  ToolResult result = RunTool({"encrypt-file", "-t", "aes128", "-k", "Sup3rSecret", dir + "/missing", good});
   EXPECT_EQ(result.status, 1);
   EXPECT_THAT(result.err, HasSubstr("missing: cannot encrypt the file (no such file)"));
+  EXPECT_THAT(result.err, Not(HasSubstr("Sup3rSecret")));
   EXPECT_NE(ReadFile(good), std::string(32, 'g'));  // the good one was still processed
   ToolResult digestType = RunTool({"encrypt-file", "-t", "md5", "-k", "k", good});
   EXPECT_EQ(digestType.status, 2);
