@@ -125,10 +125,6 @@ std::map<std::string, std::string> WithLibraryDrive(std::map<std::string, std::s
   return env;
 }
 
-bool PartMissing(const ToolResult& result) {
-  return result.status == 1 && result.err.find("this build of the library has no") != std::string::npos;
-}
-
 std::string WriteFile(const std::string& path, const std::string& content) {
   std::ofstream(path, std::ios::binary) << content;
   return path;

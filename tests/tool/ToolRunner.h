@@ -32,16 +32,9 @@ ToolResult RunTool(std::vector<std::string> args, std::string input = std::strin
 // folder (and find its resource modules beside it) while C: stays in the sandbox.
 std::map<std::string, std::string> WithLibraryDrive(std::map<std::string, std::string> env = {});
 
-// True when the tool answered that the library part behind a command is not in this build.
-bool PartMissing(const ToolResult& result);
-
 // Files in the test's own temporary folder.
 std::string WriteFile(const std::string& path, const std::string& content);
 std::string ReadFile(const std::string& path);
 
 }  // namespace OwTest
 
-#define SKIP_IF_PART_MISSING(result)                                              \
-  do {                                                                            \
-    if (::OwTest::PartMissing(result)) GTEST_SKIP() << (result).err;              \
-  } while (false)

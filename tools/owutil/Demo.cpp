@@ -24,10 +24,7 @@
 #include "owutils/StringEncodeDecode.h"
 
 // The registry store is reached through the library's public registry calls where it has them.
-#if __has_include("owutils/Registry.h")
 #include "owutils/Registry.h"
-#define OWUTIL_HAVE_REGISTRY 1
-#endif
 
 namespace owutil {
 namespace {
@@ -182,7 +179,6 @@ void Codecs(Steps& steps) {
 void Resources(Steps& steps) {
   steps.Step("Pick the language and load the resource modules");
   steps.Line("language from the environment: " + std::to_string(GetLanguageId()) + " " + CUtf8(GetLanguageIdString()));
-#if defined(OWUTIL_HAVE_REGISTRY)
   // The product's registry value overrides the environment.
   HKEY key = nullptr;
   const DWORD german = 0x407;
@@ -194,7 +190,6 @@ void Resources(Steps& steps) {
   steps.Check(set && GetLanguageId() == 0x407,
               "LanguageId = 0x407 in the sandbox's registry: " + std::to_string(GetLanguageId()) + " " +
                   CUtf8(GetLanguageIdString()));
-#endif
   steps.Check(LoadEngineResources() && LoadAppResources(nullptr) && LoadLFResources() && LoadMessageResources(),
               "engine, application, LF and message modules loaded");
   steps.Line("engine strings 1002 and 1004: '" + CUtf8(LVXSS_get(1002)) + "', '" + CUtf8(LVXSS_get(1004)) + "'");

@@ -12,17 +12,10 @@
 #include "owutils/Exceptions.h"
 
 // The registry store, through the Win32-style calls of the library's public registry header.
-#if __has_include("owutils/Registry.h")
 #include "owutils/Registry.h"
-#define OWUTIL_HAVE_REGISTRY 1
-#endif
 
 namespace owutil {
 namespace {
-
-[[maybe_unused]] [[noreturn]] void Missing(const char* part) {
-  throw Failure(std::string("this build of the library has no ") + part);
-}
 
 struct WriteOptions {
   std::string source;
@@ -98,7 +91,6 @@ int EventLogRead(const ReadOptions& options) {
   return 0;
 }
 
-#if defined(OWUTIL_HAVE_REGISTRY)
 // A key path from the command line: its hive and the path below it.
 struct KeyPath {
   HKEY hive;
@@ -260,11 +252,6 @@ int RegistryDelete(const RegistryOptions& options) {
   if (error != 0) RegistryFailure(error, options.key + ", " + options.name);
   return 0;
 }
-#else
-int RegistryGet(const RegistryOptions&) { Missing("registry access"); }
-int RegistrySet(const RegistryOptions&) { Missing("registry access"); }
-int RegistryDelete(const RegistryOptions&) { Missing("registry access"); }
-#endif
 
 }  // namespace
 

@@ -17,7 +17,7 @@
 #include <vector>
 
 #include "platform/Errors.h"
-#include "platform/Registry.h"
+#include "owutils/Registry.h"
 #include "platform/Text.h"
 #include "platform/posix/StateStore.h"
 
