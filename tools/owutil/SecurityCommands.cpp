@@ -13,15 +13,9 @@
 namespace owutil {
 namespace {
 
-// A secret-key code is the check text encrypted with the key; VerifySecretKey decrypts it and
-// compares. Its encType numbering is its own: 1-6 are the type codes 1-6, 7-11 are 9-13.
-constexpr const char16_t* kCheckText = u"harborlanternmeadowquietstoneelm";
-
 int ParseEncType(const std::string& text) {
   return static_cast<int>(ParseInteger(text, "ENCTYPE", 1, 11));
 }
-
-int TypeCodeOfEncType(int encType) { return encType <= 6 ? encType : encType + 2; }
 
 std::optional<std::uint64_t> NativeFileSize(const std::string& nativePath) {
   std::error_code error;
@@ -172,10 +166,8 @@ struct CodeOptions {
 };
 
 int MakeCode(const CodeOptions& options) {
-  int typeCode = TypeCodeOfEncType(ParseEncType(options.encType));
-  Lumo::String key = options.key.Read();
-  CEncrypt cipher(typeCode, TRUE, ToCString(key));
-  PrintLine(CUtf8(cipher.EncryptString(CString(kCheckText))));
+  const int encType = ParseEncType(options.encType);
+  PrintLine(Utf8(MakeSecretKeyCode(options.key.Read(), encType)));
   return 0;
 }
 
