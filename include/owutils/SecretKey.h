@@ -20,3 +20,8 @@
 #include "owutils/tstring.h"
 
 OWUTILS_API bool VerifySecretKey(const Lumo::String& secretKey, const Lumo::String& hexEncryptionCode, int encType);
+
+// The code that VerifySecretKey accepts for `secretKey` and `encType` (64 lower-case hex digits):
+// what a product stores when the user sets a key. An empty key, or an encType outside 1-11,
+// throws PreconditionFailed0.
+OWUTILS_API Lumo::String MakeSecretKeyCode(const Lumo::String& secretKey, int encType);

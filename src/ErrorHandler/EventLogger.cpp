@@ -13,7 +13,7 @@
 #include "platform/EventLog.h"
 #include "platform/Messages.h"
 #include "platform/Modules.h"
-#include "platform/Registry.h"
+#include "owutils/Registry.h"
 
 namespace LumoException {
 

@@ -8,7 +8,7 @@
 #include "owutils/Paths.h"
 #include "platform/Locale.h"
 #include "platform/Modules.h"
-#include "platform/Registry.h"
+#include "owutils/Registry.h"
 
 namespace LmUtils {
 

@@ -68,3 +68,12 @@ bool VerifySecretKey(const Lumo::String& secretKey, const Lumo::String& hexEncry
   }
   return difference == 0;
 }
+
+Lumo::String MakeSecretKeyCode(const Lumo::String& secretKey, int encType) {
+  PRECONDITION(secretKey.empty() == false);
+  PRECONDITION(TypeCodeFor(encType) != 0);
+  CEncrypt encryptor(TypeCodeFor(encType), TRUE, CString(static_cast<const std::u16string&>(secretKey)));
+  Lumo::String checkText;
+  checkText.AssignUtf8(kCheckText);
+  return Lumo::String(encryptor.EncryptString(CString(checkText.c_str())).str());
+}

@@ -16,7 +16,7 @@
 #include "owutils/NamedObjects.h"
 #include "platform/Debug.h"
 #include "platform/EventLog.h"
-#include "platform/Registry.h"
+#include "owutils/Registry.h"
 #include "support/TestEnvironment.h"
 
 using LumoException::EventLogger;

@@ -27,6 +27,17 @@ TEST(VerifySecretKey, EveryEncTypeVerifiesItsOwnCodeOnly) {
   }
 }
 
+TEST(VerifySecretKey, MadeCodesAreTheEncryptedCheckText) {
+  for (int encType = 1; encType <= 11; ++encType) {
+    const Lumo::String code = MakeSecretKeyCode(u"s3cret key", encType);
+    EXPECT_EQ(code, CodeFor(encType, u"s3cret key")) << encType;
+    EXPECT_TRUE(VerifySecretKey(u"s3cret key", code, encType)) << encType;
+  }
+  EXPECT_THROW(MakeSecretKeyCode(u"", 9), LumoException::PreconditionFailed0);
+  EXPECT_THROW(MakeSecretKeyCode(u"k", 0), LumoException::PreconditionFailed0);
+  EXPECT_THROW(MakeSecretKeyCode(u"k", 12), LumoException::PreconditionFailed0);
+}
+
 TEST(VerifySecretKey, CodeVariantsFromTheDefinition) {
   const Lumo::String code = CodeFor(7, u"K");
   EXPECT_TRUE(VerifySecretKey(u"K", code, 7));

@@ -5,7 +5,7 @@
 
 #include "LmUtils/ResourceState.h"
 #include "platform/Debug.h"
-#include "platform/Registry.h"
+#include "owutils/Registry.h"
 #include "support/TestEnvironment.h"
 
 namespace ResTest {

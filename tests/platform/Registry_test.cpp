@@ -11,7 +11,7 @@
 #include <thread>
 #include <vector>
 
-#include "platform/Registry.h"
+#include "owutils/Registry.h"
 #include "platform/StateDirectory.h"
 #include "support/TestEnvironment.h"
 

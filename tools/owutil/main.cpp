@@ -1,48 +1,68 @@
-// owutil: the command-line face of the OWUtils library.
+// owutil: the command-line face of the OWUtils library, for support engineers and
+// administrators: check a key, digest or encrypt a file, read the event log, see which
+// language and OEM data a machine uses. Each group of subcommands lives in a source file of
+// its own; this file parses the command line, runs the chosen command and turns its failure
+// into a message and an exit status.
 #include <cstdio>
-#include <cstring>
-#include <string>
+#include <exception>
 
+#include "Cli.h"
 #include "owutils/Exceptions.h"
-#include "owutils/tstring.h"
-
-namespace {
-
-std::string Utf8(const Lumo::String& text) { return std::string(text.ToUtf8().Get()); }
-
-int Demo() {
-  std::printf("OWUtils demo\n");
-  Lumo::String text;
-  text.Format(u"%s formats UTF-16 text: %d units, %.2f%%, 0x%08lX", u"Lumo::String", 42, 99.5, 0xBEEFu);
-  std::printf("  strings     : %s\n", Utf8(text).c_str());
-  try {
-    try {
-      PRECONDITION(text.empty());
-    } catch (LumoException::Exception& e) {
-      THROW_AT(UnableToOpenFile(u"C:\\data\\report.txt", e));
-    }
-  } catch (LumoException::Exception& e) {
-    std::printf("  exceptions  : %s (root cause %s)\n", Utf8(e.GetMessage()).c_str(), Utf8(e.GetRootCauseId()).c_str());
-    std::printf("%s", Utf8(e.ToString()).c_str());
-  }
-  return 0;
-}
-
-void Usage(FILE* out) {
-  std::fprintf(out,
-               "usage: owutil <command>\n"
-               "commands:\n"
-               "  demo    run the library's main job end to end and print each step\n");
-}
-
-}  // namespace
 
 int main(int argc, char** argv) {
-  if (argc >= 2 && std::strcmp(argv[1], "demo") == 0) return Demo();
-  if (argc >= 2 && (std::strcmp(argv[1], "--help") == 0 || std::strcmp(argv[1], "-h") == 0)) {
-    Usage(stdout);
-    return 0;
+  CLI::App app{"owutil: the command-line tool of the OWUtils library.\n"
+               "Paths are native paths. Exit status: 0 success, 1 failure, 2 bad input.",
+               "owutil"};
+  app.require_subcommand(1);
+
+  owutil::Commands commands;
+  owutil::AddDemoCommand(app, commands);
+  owutil::AddSecurityCommands(app, commands);
+  owutil::AddCodecCommands(app, commands);
+  owutil::AddInfoCommands(app, commands);
+  owutil::AddEventLogCommands(app, commands);
+  owutil::AddRegistryCommands(app, commands);
+
+  if (argc >= 2 && argv[1][0] != '-') {
+    try {
+      app.get_subcommand(argv[1]);
+    } catch (const CLI::OptionNotFound&) {
+      std::fprintf(stderr, "owutil: unknown command '%s'\nRun 'owutil --help' for the list of commands.\n", argv[1]);
+      return 2;
+    }
   }
-  Usage(stderr);
-  return 2;
+  try {
+    app.parse(argc, argv);
+  } catch (const CLI::ParseError& e) {
+    if (e.get_exit_code() == 0) return app.exit(e);
+    std::fprintf(stderr, "owutil: %s\nRun 'owutil --help' or 'owutil COMMAND --help' for usage.\n", e.what());
+    return 2;
+  }
+  if (!commands.action) {
+    std::fprintf(stderr, "owutil: a command is needed\nRun 'owutil --help' for usage.\n");
+    return 2;
+  }
+
+  std::fflush(stdout);
+  int status = 1;
+  try {
+    status = commands.action();
+  } catch (const owutil::UsageError& e) {
+    std::fprintf(stderr, "owutil: %s\n", e.what());
+    status = 2;
+  } catch (const owutil::Failure& e) {
+    std::fprintf(stderr, "owutil: %s\n", e.what());
+    status = 1;
+  } catch (const LumoException::Exception& e) {
+    std::fprintf(stderr, "owutil: %s", owutil::Utf8(e.ToString()).c_str());
+    status = 1;
+  } catch (const std::exception& e) {
+    std::fprintf(stderr, "owutil: %s\n", e.what());
+    status = 1;
+  }
+  if (std::fflush(stdout) != 0 && status == 0) {
+    std::fprintf(stderr, "owutil: cannot write the output\n");
+    status = 1;
+  }
+  return status;
 }

@@ -7,7 +7,7 @@
 #include <mutex>
 #include <string>
 
-#include "platform/Text.h"
+#include "platform/posix/NativeText.h"
 
 namespace Platform {
 namespace {
@@ -16,17 +16,6 @@ std::mutex g_outputMutex;
 OutputHook& Hook() {
   static OutputHook hook;
   return hook;
-}
-
-std::string ToUtf8(const char16_t* text) {
-  std::string result;
-  if (text == nullptr) return result;
-  int n = WideCharToMultiByte(kCodePageUtf8, 0, text, -1, nullptr, 0, nullptr, nullptr);
-  if (n <= 0) return result;
-  result.resize(static_cast<size_t>(n));
-  WideCharToMultiByte(kCodePageUtf8, 0, text, -1, result.data(), n, nullptr, nullptr);
-  result.resize(static_cast<size_t>(n - 1));
-  return result;
 }
 
 void WriteTo(const char* destination, const std::string& text) {
@@ -52,7 +41,7 @@ void OutputDebugStringW(const char16_t* text) noexcept {
     }
     const char* destination = std::getenv("OWUTILS_DEBUG_OUTPUT");
     if (destination == nullptr || *destination == 0) return;
-    WriteTo(destination, ToUtf8(text));
+    WriteTo(destination, Posix::ToUtf8(text));
   } catch (...) {
     // Debugger output is best effort: it never fails its caller.
   }
@@ -68,7 +57,7 @@ int MessageBoxW(HWND, const char16_t* text, const char16_t* caption, UINT) noexc
       Hook()("messagebox", whole);
       return kIdOk;
     }
-    std::string line = ToUtf8(whole.c_str());
+    std::string line = Posix::ToUtf8(whole);
     line.push_back('\n');
     WriteTo("stderr", line);
   } catch (...) {

@@ -4,7 +4,7 @@
 #include <cerrno>
 #include <cstring>
 
-#include "platform/Text.h"
+#include "platform/posix/NativeText.h"
 
 namespace Platform {
 namespace {
@@ -202,15 +202,7 @@ bool GetSystemMessage(DWORD code, std::u16string& text) {
 std::u16string ErrnoText(int error) {
   char buffer[256];
   // The GNU strerror_r returns the text, which may or may not live in `buffer`.
-  const char* text = strerror_r(error, buffer, sizeof buffer);
-  std::u16string result;
-  int n = MultiByteToWideChar(kCodePageUtf8, 0, text, -1, nullptr, 0);
-  if (n > 0) {
-    result.resize(static_cast<size_t>(n));
-    MultiByteToWideChar(kCodePageUtf8, 0, text, -1, result.data(), n);
-    result.resize(static_cast<size_t>(n - 1));
-  }
-  return result;
+  return Posix::ToUtf16(strerror_r(error, buffer, sizeof buffer));
 }
 
 }  // namespace Platform

@@ -3,6 +3,7 @@
 // Schema: one row per log with the number its next record gets (so numbers only grow, also after
 // the log was cleared), and one row per record holding its fields; the insertion strings are one
 // blob of UTF-16 strings, each followed by a NUL unit.
+#include "platform/posix/NativeText.h"
 #include "platform/EventLog.h"
 
 #include <syslog.h>
@@ -17,7 +18,7 @@
 #include <vector>
 
 #include "platform/Errors.h"
-#include "platform/Registry.h"
+#include "owutils/Registry.h"
 #include "platform/Text.h"
 #include "platform/posix/StateStore.h"
 
@@ -114,33 +115,11 @@ BOOL Fail(DWORD error) {
 
 bool IsLocal(const char16_t* server) { return server == nullptr || *server == 0; }
 
-std::u16string Widen(const char* text) {
-  std::u16string result;
-  int n = MultiByteToWideChar(kCodePageUtf8, 0, text, -1, nullptr, 0);
-  if (n > 0) {
-    result.resize(static_cast<size_t>(n));
-    MultiByteToWideChar(kCodePageUtf8, 0, text, -1, result.data(), n);
-    result.resize(static_cast<size_t>(n - 1));
-  }
-  return result;
-}
-
-std::string Narrow(const std::u16string& text) {
-  std::string result;
-  int n = WideCharToMultiByte(kCodePageUtf8, 0, text.c_str(), -1, nullptr, 0, nullptr, nullptr);
-  if (n > 0) {
-    result.resize(static_cast<size_t>(n));
-    WideCharToMultiByte(kCodePageUtf8, 0, text.c_str(), -1, result.data(), n, nullptr, nullptr);
-    result.resize(static_cast<size_t>(n - 1));
-  }
-  return result;
-}
-
 const std::u16string& ComputerName() {
   static const std::u16string name = [] {
     char host[256] = {};
     if (gethostname(host, sizeof host - 1) != 0) return std::u16string(u"localhost");
-    std::u16string wide = Widen(host);
+    std::u16string wide = Posix::ToUtf16(host);
     for (char16_t& c : wide) {
       if (c >= u'a' && c <= u'z') c = static_cast<char16_t>(c - 0x20);
     }
@@ -177,8 +156,8 @@ void MirrorToSyslog(const std::u16string& source, WORD type, DWORD eventId, WORD
     if (i != 0) text += u" | ";
     text += strings[i];
   }
-  syslog(LOG_USER | priority, "%s[%u]: %s", Narrow(source).c_str(), static_cast<unsigned>(eventId & 0xFFFF),
-         Narrow(text).c_str());
+  syslog(LOG_USER | priority, "%s[%u]: %s", Posix::ToUtf8(source).c_str(), static_cast<unsigned>(eventId & 0xFFFF),
+         Posix::ToUtf8(text).c_str());
 }
 
 // One record read from the store.
@@ -353,7 +332,7 @@ HANDLE OpenEventLogW(const char16_t* server, const char16_t* logName) {
     SetLastError(ERROR_INVALID_PARAMETER);
     return nullptr;
   }
-  const std::string name = Narrow(logName);
+  const std::string name = Posix::ToUtf8(logName);
   std::int64_t log = 1;
   // Opening reads the store, so that a damaged or unreadable one fails here already.
   DWORD error = Store().Read([&](StateStore& store) {

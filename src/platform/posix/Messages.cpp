@@ -12,6 +12,7 @@
 #include <vector>
 
 #include "Strings/Formatter.h"
+#include "platform/posix/NativeText.h"
 #include "platform/Errors.h"
 #include "platform/Modules.h"
 #include "platform/Text.h"
@@ -225,28 +226,6 @@ bool GetEnvironment(const std::string& name, std::string& value) {
   return false;
 }
 
-std::string ToUtf8(const std::u16string& text) {
-  std::string out;
-  int n = WideCharToMultiByte(kCodePageUtf8, 0, text.c_str(), -1, nullptr, 0, nullptr, nullptr);
-  if (n > 0) {
-    out.resize(static_cast<size_t>(n));
-    WideCharToMultiByte(kCodePageUtf8, 0, text.c_str(), -1, out.data(), n, nullptr, nullptr);
-    out.resize(static_cast<size_t>(n - 1));
-  }
-  return out;
-}
-
-std::u16string ToUtf16(const std::string& text) {
-  std::u16string out;
-  int n = MultiByteToWideChar(kCodePageUtf8, 0, text.c_str(), -1, nullptr, 0);
-  if (n > 0) {
-    out.resize(static_cast<size_t>(n));
-    MultiByteToWideChar(kCodePageUtf8, 0, text.c_str(), -1, out.data(), n);
-    out.resize(static_cast<size_t>(n - 1));
-  }
-  return out;
-}
-
 }  // namespace
 
 DWORD FormatMessageW(DWORD flags, const void* source, DWORD messageId, DWORD languageId, char16_t* buffer, DWORD size,
@@ -348,7 +327,7 @@ DWORD ExpandEnvironmentStringsW(const char16_t* source, char16_t* destination, D
         if (close != std::u16string::npos && close > i + 1) {
           std::string value;
           // An unknown name stays as it stands, with both of its percent signs.
-          out += GetEnvironment(ToUtf8(text.substr(i + 1, close - i - 1)), value) ? ToUtf16(value)
+          out += GetEnvironment(Posix::ToUtf8(text.substr(i + 1, close - i - 1)), value) ? Posix::ToUtf16(value)
                                                                                  : text.substr(i, close + 1 - i);
           i = close + 1;
           continue;
@@ -378,7 +357,7 @@ bool CTimeText(std::int64_t time, std::u16string& text) {
   char buffer[64];
   std::snprintf(buffer, sizeof buffer, "%s %s %02d %02d:%02d:%02d %d\n", kDays[local.tm_wday], kMonths[local.tm_mon],
                 local.tm_mday, local.tm_hour, local.tm_min, local.tm_sec, local.tm_year + 1900);
-  text = ToUtf16(buffer);
+  text = Posix::ToUtf16(buffer);
   return true;
 }
 

@@ -15,6 +15,7 @@
 #include <unordered_map>
 
 #include "owutils/ResourceModule.h"
+#include "platform/posix/NativeText.h"
 #include "platform/Errors.h"
 #include "platform/PathMap.h"
 #include "platform/Text.h"
@@ -49,16 +50,6 @@ void* MainProgram() noexcept {
     return self;
   }();
   return main;
-}
-
-std::string Utf8(const char16_t* text) {
-  std::string result;
-  int n = WideCharToMultiByte(kCodePageUtf8, 0, text, -1, nullptr, 0, nullptr, nullptr);
-  if (n <= 0) return result;
-  result.resize(static_cast<size_t>(n));
-  WideCharToMultiByte(kCodePageUtf8, 0, text, -1, result.data(), n, nullptr, nullptr);
-  result.resize(static_cast<size_t>(n - 1));
-  return result;
 }
 
 // Resource tables already found, for modules loaded here (only FreeLibrary can unload those,
@@ -136,7 +127,7 @@ HMODULE LoadLibraryExW(const char16_t* path, HANDLE file, DWORD flags) noexcept 
     std::string native;
     std::u16string text(path);
     if (text.find_first_of(u"\\/:") == std::u16string::npos) {
-      native = Utf8(path);
+      native = Posix::ToUtf8(path);
     } else if (!MapToNative(path, native)) {
       return nullptr;
     }
@@ -236,7 +227,7 @@ HMODULE GetModuleHandleW(const char16_t* name) noexcept {
     std::string native;
     std::u16string text(name);
     if (text.find_first_of(u"\\/:") == std::u16string::npos) {
-      native = Utf8(name);
+      native = Posix::ToUtf8(name);
     } else if (!MapToNative(name, native)) {
       SetLastError(ERROR_MOD_NOT_FOUND);
       return nullptr;

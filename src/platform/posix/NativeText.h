@@ -25,6 +25,10 @@ inline std::string ToUtf8(const char16_t* text, size_t length) {
   return out;
 }
 inline std::string ToUtf8(const std::u16string& text) { return ToUtf8(text.data(), text.size()); }
+// A NUL-terminated text; null gives an empty string.
+inline std::string ToUtf8(const char16_t* text) {
+  return text == nullptr ? std::string() : ToUtf8(text, std::char_traits<char16_t>::length(text));
+}
 
 // UTF-8 to UTF-16; a byte that is not UTF-8 becomes U+FFFD.
 inline std::u16string ToUtf16(const char* text, size_t length) {
@@ -45,5 +49,9 @@ inline std::u16string ToUtf16(const char* text, size_t length) {
   return out;
 }
 inline std::u16string ToUtf16(const std::string& text) { return ToUtf16(text.data(), text.size()); }
+// A NUL-terminated text; null gives an empty string.
+inline std::u16string ToUtf16(const char* text) {
+  return text == nullptr ? std::u16string() : ToUtf16(text, std::char_traits<char>::length(text));
+}
 
 }  // namespace Platform::Posix

@@ -3,7 +3,7 @@
 // Schema: a tree of keys (each row names its parent; the hives are the rows 1 and 2 with parent
 // 0) and the values of each key. Names are kept twice as UTF-16 blobs: as written and upper-cased
 // for lookup, so that names compare without regard to case and keep their exact units.
-#include "platform/Registry.h"
+#include "owutils/Registry.h"
 
 #include <cstring>
 #include <mutex>

@@ -8,6 +8,7 @@
 #include <cerrno>
 #include <cstdlib>
 
+#include "platform/posix/NativeText.h"
 #include "platform/Errors.h"
 #include "platform/Text.h"
 #include "platform/posix/StateStore.h"
@@ -72,11 +73,7 @@ bool NativeStateDirectory(std::string& path) {
 bool GetStateDirectory(std::u16string& path) {
   std::string native;
   if (!posix::NativeStateDirectory(native)) return false;
-  int n = MultiByteToWideChar(kCodePageUtf8, 0, native.c_str(), -1, nullptr, 0);
-  if (n <= 0) return false;
-  path.resize(static_cast<size_t>(n));
-  MultiByteToWideChar(kCodePageUtf8, 0, native.c_str(), -1, path.data(), n);
-  path.resize(static_cast<size_t>(n - 1));
+  path = Posix::ToUtf16(native);
   return true;
 }
 

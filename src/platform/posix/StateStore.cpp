@@ -6,8 +6,10 @@
 #include <wctype.h>
 
 #include <cerrno>
+#include <chrono>
 #include <cstring>
 #include <new>
+#include <thread>
 
 #include "platform/Errors.h"
 
@@ -203,6 +205,20 @@ DWORD StateStore::Open() {
 
 DWORD StateStore::Run(const Work& work, bool write) {
   std::lock_guard<std::recursive_mutex> guard(m_lock);
+  // A nested call joins the transaction of its caller, which retries as a whole.
+  if (m_db != nullptr && sqlite3_get_autocommit(m_db) == 0) return Attempt(work, write);
+  // SQLite's busy handler does not cover every wait: switching a new database to WAL, recovering
+  // a WAL left by a killed writer and some lock upgrades answer SQLITE_BUSY at once. Such an
+  // attempt changed nothing, so it is simply made again, within the same time limit.
+  const auto deadline = std::chrono::steady_clock::now() + std::chrono::milliseconds(kBusyTimeoutMs);
+  for (int attempt = 0;; ++attempt) {
+    DWORD error = Attempt(work, write);
+    if (error != ERROR_BUSY || std::chrono::steady_clock::now() >= deadline) return error;
+    std::this_thread::sleep_for(std::chrono::milliseconds(1 + (attempt % 8) * (1 + getpid() % 3)));
+  }
+}
+
+DWORD StateStore::Attempt(const Work& work, bool write) {
   DWORD error = Open();
   if (error != ERROR_SUCCESS) return error;
   // A nested call (a store operation made by the work of another) joins the open transaction.

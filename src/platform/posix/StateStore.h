@@ -85,6 +85,7 @@ class StateStore {
 
  private:
   DWORD Run(const Work& work, bool write);
+  DWORD Attempt(const Work& work, bool write);
   DWORD Open();
   void Close();
 

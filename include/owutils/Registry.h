@@ -1,4 +1,4 @@
-// Platform service: the registry.
+// The registry: the library's configuration store, also open to client programs and tools.
 //
 // The calls the library makes on the Windows registry, with their Win32 behaviour: two hives
 // (HKEY_LOCAL_MACHINE, HKEY_CURRENT_USER), key paths separated by backslashes, key and value
@@ -25,6 +25,7 @@
 //   }
 #pragma once
 
+#include "owutils/Export.h"
 #include "owutils/WinTypes.h"
 
 #if !defined(_WIN32)
@@ -70,23 +71,23 @@ namespace Platform {
 // Opens `subKey` below `key`, creating it and any missing parents (disposition
 // REG_CREATED_NEW_KEY) or opening it as it is (REG_OPENED_EXISTING_KEY). A null or empty
 // `subKey` opens a new handle to `key` itself. `access` holds the KEY_* rights the handle grants.
-LONG RegCreateKeyExW(HKEY key, const char16_t* subKey, DWORD reserved, char16_t* className, DWORD options,
+OWUTILS_API LONG RegCreateKeyExW(HKEY key, const char16_t* subKey, DWORD reserved, char16_t* className, DWORD options,
                      REGSAM access, void* security, HKEY* result, DWORD* disposition);
 // Opens an existing key; 2 when it does not exist.
-LONG RegOpenKeyExW(HKEY key, const char16_t* subKey, DWORD options, REGSAM access, HKEY* result);
+OWUTILS_API LONG RegOpenKeyExW(HKEY key, const char16_t* subKey, DWORD options, REGSAM access, HKEY* result);
 // Reads value `name` (null or empty: the key's default value). `type` receives the REG_* type;
 // with `data` null, `*size` receives the size in bytes; with a buffer too small, 234 and the size
 // needed; `size` may be null only when `data` is null. Needs KEY_QUERY_VALUE.
-LONG RegQueryValueExW(HKEY key, const char16_t* name, DWORD* reserved, DWORD* type, BYTE* data, DWORD* size);
+OWUTILS_API LONG RegQueryValueExW(HKEY key, const char16_t* name, DWORD* reserved, DWORD* type, BYTE* data, DWORD* size);
 // Writes value `name` with `type` and exactly `size` bytes of `data` (replacing any value of that
 // name, whatever its case). Needs KEY_SET_VALUE.
-LONG RegSetValueExW(HKEY key, const char16_t* name, DWORD reserved, DWORD type, const BYTE* data, DWORD size);
+OWUTILS_API LONG RegSetValueExW(HKEY key, const char16_t* name, DWORD reserved, DWORD type, const BYTE* data, DWORD size);
 // Removes value `name`; 2 when there is none. Needs KEY_SET_VALUE.
-LONG RegDeleteValueW(HKEY key, const char16_t* name);
+OWUTILS_API LONG RegDeleteValueW(HKEY key, const char16_t* name);
 // Removes key `subKey` below `key` with its values; 5 when it still has subkeys, 2 when missing.
-LONG RegDeleteKeyW(HKEY key, const char16_t* subKey);
+OWUTILS_API LONG RegDeleteKeyW(HKEY key, const char16_t* subKey);
 // Closes a handle from RegCreateKeyExW or RegOpenKeyExW. The predefined hive handles need no
 // closing (closing them succeeds and does nothing).
-LONG RegCloseKey(HKEY key);
+OWUTILS_API LONG RegCloseKey(HKEY key);
 
 }  // namespace Platform
