@@ -23,7 +23,7 @@
 
 #include "platform/Errors.h"
 #include "platform/EventLog.h"
-#include "platform/Registry.h"
+#include "owutils/Registry.h"
 #include "support/TestEnvironment.h"
 
 namespace OwTest {
