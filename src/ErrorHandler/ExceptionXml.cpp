@@ -106,6 +106,28 @@ bool NameIs(const XmlAttribute* attribute, const char* name) {
   return attribute->name_size() == length && std::memcmp(attribute->name(), name, length) == 0;
 }
 
+// The text of a value element (`message`, `usermessage`). RapidXml drops content made only of
+// white space, which would turn a message of blanks into an empty one; that content is taken
+// from the parsed text itself, which is parsed without in-place terminators and so still holds
+// the start tag and the white space after it as they were written.
+std::string ElementText(const XmlNode* node) {
+  if (node->value_size() != 0 || node->first_node() != nullptr) return std::string(node->value(), node->value_size());
+  const char* p = node->name() + node->name_size();
+  char previous = 0;
+  while (*p != 0 && *p != '>') {
+    if (*p == '"' || *p == '\'') {
+      const char quote = *p++;
+      while (*p != 0 && *p != quote) ++p;
+      if (*p == 0) return {};
+    }
+    previous = *p++;
+  }
+  if (*p != '>' || previous == '/') return {};
+  const char* start = ++p;
+  while (*p == ' ' || *p == '\t' || *p == '\r' || *p == '\n') ++p;
+  return *p == '<' ? std::string(start, p) : std::string();
+}
+
 // Skips a quoted attribute value starting at text[i] (the quote). Returns the index after it.
 size_t SkipQuoted(const std::string& text, size_t i) {
   const char quote = text[i];
@@ -210,7 +232,7 @@ RemoteException::RemoteException(const Lumo::String& xml) : Exception(xml.c_str(
     if (ElementNesting(utf8, kMaxParseNesting) > kMaxParseNesting) return;
 
     XmlDocument doc;
-    doc.parse<0>(utf8.data());
+    doc.parse<rapidxml::parse_no_string_terminators>(utf8.data());
     const XmlNode* element = doc.first_node("exception");
     if (element == nullptr) return;
     ReadElement(*element, 1);
@@ -250,9 +272,11 @@ void RemoteException::ReadElement(const Node& element, int depth) {
         AppendHistoryEvent(event);
       }
     } else if (NameIs(child, "message")) {
-      SetMessage(FromUtf8(child->value(), child->value_size()).c_str());
+      const std::string value = ElementText(child);
+      SetMessage(FromUtf8(value.data(), value.size()).c_str());
     } else if (NameIs(child, "usermessage")) {
-      SetUserMessage(FromUtf8(child->value(), child->value_size()).c_str());
+      const std::string value = ElementText(child);
+      SetUserMessage(FromUtf8(value.data(), value.size()).c_str());
     } else if (NameIs(child, "exception")) {
       // One cause only, and no deeper than the chain limit: the rest is ignored.
       if (GetCause() != nullptr || IsPostCloned() || depth >= kMaxChainDepth) continue;
