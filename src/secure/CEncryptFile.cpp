@@ -73,6 +73,19 @@ bool WriteAll(HANDLE file, const BYTE* data, DWORD size, DWORD* written) {
   return true;
 }
 
+// Reads until `size` bytes are in or the file ends: a read may return less than asked for before
+// the end, and taking that for the end would leave the rest of the file unprocessed.
+bool ReadChunk(HANDLE file, BYTE* data, DWORD size, DWORD* read) {
+  *read = 0;
+  while (*read < size) {
+    DWORD got = 0;
+    if (!Platform::ReadFile(file, data + *read, size - *read, &got, nullptr)) return false;
+    if (got == 0) break;
+    *read += got;
+  }
+  return true;
+}
+
 }  // namespace
 
 // ---- File encryption ------------------------------------------------------------------------
@@ -105,7 +118,7 @@ BOOL CEncrypt::ProcessFile(const CString& strFile, bool encrypt) {
     ULONGLONG position = 0;
     DWORD read = 0;
     do {
-      if (!Platform::ReadFile(file.Get(), buffer.get(), FILE_BUFFER_SIZE, &read, nullptr)) ThrowFileError(strFile);
+      if (!ReadChunk(file.Get(), buffer.get(), FILE_BUFFER_SIZE, &read)) ThrowFileError(strFile);
       if (read > 0) {
         forward->ProcessBlocks(buffer.get(), read / blockSize);
         Seek(file.Get(), position, strFile);
