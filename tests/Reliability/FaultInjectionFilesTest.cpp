@@ -28,9 +28,7 @@ struct Fault {
   DWORD error;      // 0: a short transfer
 };
 
-// The platform calls file operations make, each with the failures worth trying. CloseHandle is
-// left out: an injected failure returns before the handle is released, which a real close
-// never does, so every run would leak the handle.
+// The platform calls file operations make, each with the failures worth trying.
 const std::vector<Fault>& Faults() {
   static const std::vector<Fault> faults = {
       {"CreateFile", ERROR_ACCESS_DENIED},    {"CreateFile", ERROR_DISK_FULL},
@@ -46,6 +44,7 @@ const std::vector<Fault>& Faults() {
       {"FindNextFile", ERROR_IO_DEVICE},      {"GetFileTime", ERROR_IO_DEVICE},
       {"SetFileTime", ERROR_ACCESS_DENIED},   {"GetFileInformationByHandle", ERROR_IO_DEVICE},
       {"DeleteFile", ERROR_ACCESS_DENIED},    {"MoveFile", ERROR_ACCESS_DENIED},
+      {"CloseHandle", ERROR_IO_DEVICE},
   };
   return faults;
 }

@@ -636,7 +636,6 @@ BOOL SetFileTime(HANDLE file, const FILETIME*, const FILETIME* lastAccess, const
 }
 
 BOOL CloseHandle(HANDLE handle) noexcept {
-  if (Check("CloseHandle")) return FALSE;
   if (handle == nullptr || handle == INVALID_HANDLE_VALUE) return Fail(ERROR_INVALID_HANDLE);
   auto* object = static_cast<HandleObject*>(handle);
   if (!object->IsValid()) return Fail(ERROR_INVALID_HANDLE);
@@ -644,6 +643,9 @@ BOOL CloseHandle(HANDLE handle) noexcept {
   DWORD error = GetLastError();
   delete object;
   if (!ok) return Fail(error);
+  // As on Windows, a close that fails has still released the handle: an injected failure is
+  // reported after the release, never instead of it.
+  if (Check("CloseHandle")) return FALSE;
   return TRUE;
 }
 
