@@ -78,14 +78,14 @@ void PutWideString(Sink& sink, const Spec& spec, const char16_t* s) {
 
 void PutNarrowString(Sink& sink, const Spec& spec, const char* s) {
   if (s == nullptr) s = "(null)";
-  // Widen first (UTF-8), then treat like a wide string so precision counts UTF-16 units.
-  size_t bytes = std::strlen(s);
+  // Widen first (UTF-8), then treat like a wide string so precision counts UTF-16 units. Only as
+  // much is read as the precision needs, so an unterminated array with a precision is safe; the
+  // decoder never reads past the terminator, which is never a continuation byte.
+  const size_t limit = spec.precision < 0 ? SIZE_MAX : static_cast<size_t>(spec.precision);
   std::u16string wide;
-  wide.reserve(bytes);
   const auto* p = reinterpret_cast<const unsigned char*>(s);
-  const auto* end = p + bytes;
-  while (p < end) {
-    char32_t cp = NextUtf8(p, static_cast<size_t>(end - p));
+  while (wide.size() < limit && *p != 0) {
+    char32_t cp = NextUtf8(p, SIZE_MAX);
     if (cp >= 0x10000) {
       cp -= 0x10000;
       wide.push_back(static_cast<char16_t>(0xD800 + (cp >> 10)));

@@ -22,6 +22,16 @@ TEST(FuzzRegressionFormat, PrecisionBoundsAnUnterminatedWideString) {
   EXPECT_EQ(s, u"[abc|ab|abc  ]");
 }
 
+// format: "%.3hs" with an unterminated narrow array: the precision bounds what is read there too
+// (the narrow text used to be measured with strlen before its precision applied).
+TEST(FuzzRegressionFormat, PrecisionBoundsAnUnterminatedNarrowString) {
+  const char bytes[] = {'x', '\xC3', '\xA9', 'z'};  // x, e-acute, z
+  OwTest::GuardedArray<char> text(bytes, 4);
+  Lumo::String s;
+  s.Format(u"[%.3hs|%.2hs]", text.get(), text.get());
+  EXPECT_EQ(s, u"[x\u00e9z|x\u00e9]");
+}
+
 // xml: the text " " (not XML, so it becomes the message) written with ToXml and read back
 // came back with an empty message: the XML parser drops element text made only of white space.
 TEST(FuzzRegressionXml, MessageOfOnlyWhiteSpaceSurvivesTheExchange) {
