@@ -39,6 +39,8 @@ TEST(FormatMessage, InsertsAndEscapes) {
   EXPECT_EQ(Format(0, u"cut here%0 never seen %1"), u"cut here");
   EXPECT_EQ(Format(0, u"%2 before %1", u"one", u"two"), u"two before one");
   EXPECT_EQ(Format(0, u"%1!I64u! %2!s!", 12345678901234ULL, u"z"), u"12345678901234 z");
+  // Explicit sizes take exactly what the caller passed: 32 bits for I32, a pointer for I.
+  EXPECT_EQ(Format(0, u"%1!I32d! %2!s! %3!Iu!", -7, u"z", static_cast<size_t>(1) << 40), u"-7 z 1099511627776");
   // Width and precision from the following inserts.
   EXPECT_EQ(Format(0, u"%1!*.*s! %4 %5!*s!", 4, 2, u"Bill", u"Bob", 6, u"Bill"), u"  Bi Bob   Bill");
   // Inserts copied as they stand.

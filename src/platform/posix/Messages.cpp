@@ -61,6 +61,8 @@ bool KindOf(const std::u16string& spec, Kind& kind) {
   if (spec.find(u"I64") != std::u16string::npos || spec.find(u"ll") != std::u16string::npos ||
       spec.find(u'j') != std::u16string::npos) {
     kind = Kind::Int64;
+  } else if (spec.find(u"I32") != std::u16string::npos) {
+    kind = Kind::Int32;  // explicitly 32 bits, as the printf engine reads it
   } else if (spec.find(u'I') != std::u16string::npos || spec.find(u'z') != std::u16string::npos ||
              spec.find(u't') != std::u16string::npos) {
     kind = sizeof(void*) == 8 ? Kind::Int64 : Kind::Int32;
