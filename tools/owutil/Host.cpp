@@ -1,37 +1,26 @@
-// The three host services owutil needs that the library does not offer: whether standard error
-// is a terminal (for the progress display) and reading and setting environment variables (for
-// the demo's sandbox). Kept here, alone, so that the rest of the tool stays free of system
-// headers.
-#include <cstdlib>
+// The host services owutil needs beside the library's own work: whether standard error is a
+// terminal (for the progress display) and the environment variables of the demo's sandbox.
 #include <string>
 
-#if defined(_WIN32)
-#include <io.h>
-#else
-#include <unistd.h>
-#endif
+#include "Cli.h"
+#include "owutils/Environment.h"
 
 namespace owutil {
 
-bool StderrIsTerminal() {
-#if defined(_WIN32)
-  return _isatty(2) != 0;
-#else
-  return isatty(2) != 0;
-#endif
-}
+bool StderrIsTerminal() { return Platform::IsConsoleStream(STD_ERROR_HANDLE) != FALSE; }
 
 bool SetEnvironmentVariable(const char* name, const std::string& value) {
-#if defined(_WIN32)
-  return _putenv_s(name, value.c_str()) == 0;
-#else
-  return setenv(name, value.c_str(), 1) == 0;
-#endif
+  return Platform::SetEnvironmentVariableW(Wide(name, "NAME").c_str(), Wide(value, "VALUE").c_str()) != FALSE;
 }
 
 std::string GetEnvironmentVariable(const char* name) {
-  const char* value = std::getenv(name);
-  return value != nullptr ? std::string(value) : std::string();
+  const Lumo::String wideName = Wide(name, "NAME");
+  const DWORD size = Platform::GetEnvironmentVariableW(wideName.c_str(), nullptr, 0);
+  if (size == 0) return std::string();
+  Lumo::String value(size, u'\0');
+  const DWORD length = Platform::GetEnvironmentVariableW(wideName.c_str(), value.data(), size);
+  value.resize(length < size ? length : 0);
+  return Utf8(value);
 }
 
 }  // namespace owutil
