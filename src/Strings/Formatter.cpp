@@ -35,7 +35,7 @@ class Sink {
 
 enum class Size { Default, Char, Short, Long32, Long64, Pointer, LongDouble };
 
-struct Spec {
+struct Conversion {
   bool left = false, plus = false, space = false, alt = false, zero = false;
   int width = 0;
   int precision = -1;
@@ -60,28 +60,28 @@ char32_t NextUtf8(const unsigned char*& s, size_t n) {
   return cp;
 }
 
-void PutPadded(Sink& sink, const Spec& spec, const char16_t* text, size_t length) {
-  size_t pad = spec.width > 0 && static_cast<size_t>(spec.width) > length ? spec.width - length : 0;
-  if (!spec.left) sink.Repeat(spec.zero ? u'0' : u' ', pad);
+void PutPadded(Sink& sink, const Conversion& conv, const char16_t* text, size_t length) {
+  size_t pad = conv.width > 0 && static_cast<size_t>(conv.width) > length ? conv.width - length : 0;
+  if (!conv.left) sink.Repeat(conv.zero ? u'0' : u' ', pad);
   for (size_t i = 0; i < length; ++i) sink.Put(text[i]);
-  if (spec.left) sink.Repeat(u' ', pad);
+  if (conv.left) sink.Repeat(u' ', pad);
 }
 
-void PutWideString(Sink& sink, const Spec& spec, const char16_t* s) {
+void PutWideString(Sink& sink, const Conversion& conv, const char16_t* s) {
   if (s == nullptr) s = u"(null)";
   size_t length = 0;
-  while ((spec.precision < 0 || length < static_cast<size_t>(spec.precision)) && s[length] != 0) {
+  while ((conv.precision < 0 || length < static_cast<size_t>(conv.precision)) && s[length] != 0) {
     ++length;
   }
-  PutPadded(sink, spec, s, length);
+  PutPadded(sink, conv, s, length);
 }
 
-void PutNarrowString(Sink& sink, const Spec& spec, const char* s) {
+void PutNarrowString(Sink& sink, const Conversion& conv, const char* s) {
   if (s == nullptr) s = "(null)";
   // Widen first (UTF-8), then treat like a wide string so precision counts UTF-16 units. Only as
   // much is read as the precision needs, so an unterminated array with a precision is safe; the
   // decoder never reads past the terminator, which is never a continuation byte.
-  const size_t limit = spec.precision < 0 ? SIZE_MAX : static_cast<size_t>(spec.precision);
+  const size_t limit = conv.precision < 0 ? SIZE_MAX : static_cast<size_t>(conv.precision);
   std::u16string wide;
   const auto* p = reinterpret_cast<const unsigned char*>(s);
   while (wide.size() < limit && *p != 0) {
@@ -94,20 +94,20 @@ void PutNarrowString(Sink& sink, const Spec& spec, const char* s) {
       wide.push_back(static_cast<char16_t>(cp));
     }
   }
-  PutWideString(sink, spec, wide.c_str());
+  PutWideString(sink, conv, wide.c_str());
 }
 
 // Builds "%<flags><width>.<precision><length><conversion>" for snprintf.
-void BuildNarrowSpec(char* buffer, const Spec& spec, const char* length, char conversion) {
+void BuildNarrowSpec(char* buffer, const Conversion& conv, const char* length, char conversion) {
   char* p = buffer;
   *p++ = '%';
-  if (spec.left) *p++ = '-';
-  if (spec.plus) *p++ = '+';
-  if (spec.space) *p++ = ' ';
-  if (spec.alt) *p++ = '#';
-  if (spec.zero) *p++ = '0';
-  if (spec.width > 0) p += std::snprintf(p, 12, "%d", spec.width);
-  if (spec.precision >= 0) p += std::snprintf(p, 13, ".%d", spec.precision);
+  if (conv.left) *p++ = '-';
+  if (conv.plus) *p++ = '+';
+  if (conv.space) *p++ = ' ';
+  if (conv.alt) *p++ = '#';
+  if (conv.zero) *p++ = '0';
+  if (conv.width > 0) p += std::snprintf(p, 12, "%d", conv.width);
+  if (conv.precision >= 0) p += std::snprintf(p, 13, ".%d", conv.precision);
   while (*length != 0) *p++ = *length++;
   *p++ = conversion;
   *p = 0;
@@ -156,14 +156,14 @@ int FormatUtf16(char16_t* out, size_t capacity, const char16_t* format, va_list 
       ++f;
       continue;
     }
-    Spec spec;
+    Conversion conv;
     for (bool flag = true; flag;) {
       switch (*f) {
-        case u'-': spec.left = true; ++f; break;
-        case u'+': spec.plus = true; ++f; break;
-        case u' ': spec.space = true; ++f; break;
-        case u'#': spec.alt = true; ++f; break;
-        case u'0': spec.zero = true; ++f; break;
+        case u'-': conv.left = true; ++f; break;
+        case u'+': conv.plus = true; ++f; break;
+        case u' ': conv.space = true; ++f; break;
+        case u'#': conv.alt = true; ++f; break;
+        case u'0': conv.zero = true; ++f; break;
         default: flag = false;
       }
     }
@@ -171,11 +171,11 @@ int FormatUtf16(char16_t* out, size_t capacity, const char16_t* format, va_list 
       ++f;
       int w = va_arg(ap, int);
       if (w < 0) {
-        spec.left = true;
+        conv.left = true;
         w = w == INT32_MIN ? kMaxField + 1 : -w;
       }
-      spec.width = w;
-    } else if (!ReadNumber(f, spec.width)) {
+      conv.width = w;
+    } else if (!ReadNumber(f, conv.width)) {
       ok = false;
       break;
     }
@@ -184,13 +184,13 @@ int FormatUtf16(char16_t* out, size_t capacity, const char16_t* format, va_list 
       if (*f == u'*') {
         ++f;
         int p = va_arg(ap, int);
-        spec.precision = p < 0 ? -1 : p;
-      } else if (!ReadNumber(f, spec.precision)) {
+        conv.precision = p < 0 ? -1 : p;
+      } else if (!ReadNumber(f, conv.precision)) {
         ok = false;
         break;
       }
     }
-    if (spec.width > kMaxField || spec.precision > kMaxField) {
+    if (conv.width > kMaxField || conv.precision > kMaxField) {
       ok = false;
       break;
     }
@@ -200,9 +200,9 @@ int FormatUtf16(char16_t* out, size_t capacity, const char16_t* format, va_list 
         ++f;
         if (*f == u'h') {
           ++f;
-          spec.size = Size::Char;
+          conv.size = Size::Char;
         } else {
-          spec.size = Size::Short;
+          conv.size = Size::Short;
         }
         narrowText = true;
         break;
@@ -210,27 +210,27 @@ int FormatUtf16(char16_t* out, size_t capacity, const char16_t* format, va_list 
         ++f;
         if (*f == u'l') {
           ++f;
-          spec.size = Size::Long64;
+          conv.size = Size::Long64;
         } else {
-          spec.size = Size::Long32;
+          conv.size = Size::Long32;
           wideText = true;
         }
         break;
       case u'w': ++f; wideText = true; break;
-      case u'L': ++f; spec.size = Size::LongDouble; break;
-      case u'j': ++f; spec.size = Size::Long64; break;
+      case u'L': ++f; conv.size = Size::LongDouble; break;
+      case u'j': ++f; conv.size = Size::Long64; break;
       case u'z':
-      case u't': ++f; spec.size = Size::Pointer; break;
+      case u't': ++f; conv.size = Size::Pointer; break;
       case u'I':
         ++f;
         if (f[0] == u'6' && f[1] == u'4') {
           f += 2;
-          spec.size = Size::Long64;
+          conv.size = Size::Long64;
         } else if (f[0] == u'3' && f[1] == u'2') {
           f += 2;
-          spec.size = Size::Long32;
+          conv.size = Size::Long32;
         } else {
-          spec.size = Size::Pointer;
+          conv.size = Size::Pointer;
         }
         break;
       default: break;
@@ -250,11 +250,11 @@ int FormatUtf16(char16_t* out, size_t capacity, const char16_t* format, va_list 
       case u'x':
       case u'X': {
         bool isSigned = conversion == u'd' || conversion == u'i';
-        char conv = conversion == u'i' ? 'd' : static_cast<char>(conversion);
-        BuildNarrowSpec(narrowSpec, spec, "ll", conv);
+        char narrowConversion = conversion == u'i' ? 'd' : static_cast<char>(conversion);
+        BuildNarrowSpec(narrowSpec, conv, "ll", narrowConversion);
         long long sv = 0;
         unsigned long long uv = 0;
-        switch (spec.size) {
+        switch (conv.size) {
           case Size::Long64:
             sv = va_arg(ap, long long);
             uv = static_cast<unsigned long long>(sv);
@@ -266,8 +266,8 @@ int FormatUtf16(char16_t* out, size_t capacity, const char16_t* format, va_list 
             break;
           default: {
             int v = va_arg(ap, int);
-            if (spec.size == Size::Short) v = isSigned ? static_cast<short>(v) : static_cast<unsigned short>(v);
-            if (spec.size == Size::Char) v = isSigned ? static_cast<signed char>(v) : static_cast<unsigned char>(v);
+            if (conv.size == Size::Short) v = isSigned ? static_cast<short>(v) : static_cast<unsigned short>(v);
+            if (conv.size == Size::Char) v = isSigned ? static_cast<signed char>(v) : static_cast<unsigned char>(v);
             sv = v;
             uv = static_cast<unsigned int>(v);
             break;
@@ -284,17 +284,17 @@ int FormatUtf16(char16_t* out, size_t capacity, const char16_t* format, va_list 
       case u'G':
       case u'a':
       case u'A':
-        if (spec.size == Size::LongDouble) {
-          BuildNarrowSpec(narrowSpec, spec, "L", static_cast<char>(conversion));
+        if (conv.size == Size::LongDouble) {
+          BuildNarrowSpec(narrowSpec, conv, "L", static_cast<char>(conversion));
           ok = PutNumber(sink, narrowSpec, va_arg(ap, long double));
         } else {
-          BuildNarrowSpec(narrowSpec, spec, "", static_cast<char>(conversion));
+          BuildNarrowSpec(narrowSpec, conv, "", static_cast<char>(conversion));
           ok = PutNumber(sink, narrowSpec, va_arg(ap, double));
         }
         break;
       case u'p': {
-        Spec hex = spec;
-        hex.zero = !spec.left;
+        Conversion hex = conv;
+        hex.zero = !conv.left;
         hex.alt = false;
         hex.precision = -1;
         if (hex.width < static_cast<int>(2 * sizeof(void*))) hex.width = 2 * sizeof(void*);
@@ -309,7 +309,7 @@ int FormatUtf16(char16_t* out, size_t capacity, const char16_t* format, va_list 
         char16_t unit;
         bool narrow = narrowText || (conversion == u'C' && !wideText);
         unit = narrow ? static_cast<char16_t>(static_cast<unsigned char>(v)) : static_cast<char16_t>(v);
-        Spec text = spec;
+        Conversion text = conv;
         text.precision = -1;
         PutPadded(sink, text, &unit, 1);
         break;
@@ -318,9 +318,9 @@ int FormatUtf16(char16_t* out, size_t capacity, const char16_t* format, va_list 
       case u'S': {
         bool narrow = narrowText || (conversion == u'S' && !wideText);
         if (narrow) {
-          PutNarrowString(sink, spec, va_arg(ap, const char*));
+          PutNarrowString(sink, conv, va_arg(ap, const char*));
         } else {
-          PutWideString(sink, spec, va_arg(ap, const char16_t*));
+          PutWideString(sink, conv, va_arg(ap, const char16_t*));
         }
         break;
       }

@@ -5,7 +5,7 @@
 // (FROM_HMODULE: `source` is the module; with FROM_SYSTEM as well, the system texts are the
 // fallback) or from the system's texts (FROM_SYSTEM). In the template:
 //   %1 .. %99       insert n, as a string ("%1" is "%1!s!")
-//   %n!fmt!         insert n formatted with the printf specification fmt ("%2!d!", "%1!08lX!",
+//   %n!fmt!         insert n formatted with the printf format fmt ("%2!d!", "%1!08lX!",
 //                   "%1!*.*s!" takes width and precision from inserts n and n+1 and the value
 //                   from n+2); floating-point conversions are refused
 //   %0              ends the text here, without a final line break

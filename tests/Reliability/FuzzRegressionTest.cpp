@@ -50,10 +50,10 @@ TEST(FuzzRegressionXml, WhiteSpaceAroundTextSurvivesTheExchange) {
   EXPECT_EQ(second.GetMessage(), first.GetMessage());
 }
 
-// messages: an insert's printf specification holding a '%' of its own ("%1!s%s!") was handed
+// messages: an insert's printf format holding a '%' of its own ("%1!s%s!") was handed
 // to the printf engine as a whole format, which then read further arguments than the one the
 // insert supplies: garbage from the registers, or a crash for a further %s. Such a
-// specification is refused like any other malformed insert. So is one with more than the two
+// format is refused like any other malformed insert. So is one with more than the two
 // '*' a width and a precision can take ("%1!*.*.*s!" wrote a third width past its array), and
 // one with anything after its conversion: in "%49!S .*s!" the engine took %S and read the
 // width meant for the '*' as a string pointer.
@@ -68,7 +68,7 @@ TEST(FuzzRegressionMessages, InsertSpecificationWithItsOwnPercentIsRefused) {
     EXPECT_EQ(n, 0u) << OwTest::Narrow(format);
     EXPECT_EQ(Platform::GetLastError(), static_cast<DWORD>(ERROR_INVALID_PARAMETER)) << OwTest::Narrow(format);
   }
-  // Well-formed specifications still work.
+  // Well-formed formats still work.
   DWORD_PTR widths[] = {reinterpret_cast<DWORD_PTR>(u"one"), reinterpret_cast<DWORD_PTR>(u"two"), 5, 2,
                               reinterpret_cast<DWORD_PTR>(u"four")};
   char16_t buffer[256] = {};

@@ -26,20 +26,20 @@ constexpr int kMaxInsert = 99;
 
 enum class Kind { Pointer, Int32, Int64 };
 
-// A piece of a parsed template: literal text, or an insert with its printf specification.
+// A piece of a parsed template: literal text, or an insert with its printf format.
 struct Piece {
   std::u16string text;  // literal text (when index is 0)
   int index = 0;        // insert number
-  std::u16string spec;  // printf specification without the '%' ("s", "*.*s", "08lX")
+  std::u16string fmt;  // printf format without the '%' ("s", "*.*s", "08lX")
   int stars = 0;
   Kind kind = Kind::Pointer;
 };
 
-// The kind of value a printf specification takes; false for one FormatMessage refuses. A
-// specification is flag, width, precision and length characters, then its one conversion.
-bool KindOf(const std::u16string& spec, Kind& kind) {
-  if (spec.empty() || spec.find_first_not_of(u"-+ #0123456789.*hlwIjztL") != spec.size() - 1) return false;
-  const char16_t conversion = spec.back();
+// The kind of value a printf format takes; false for one FormatMessage refuses. A
+// format is flag, width, precision and length characters, then its one conversion.
+bool KindOf(const std::u16string& fmt, Kind& kind) {
+  if (fmt.empty() || fmt.find_first_not_of(u"-+ #0123456789.*hlwIjztL") != fmt.size() - 1) return false;
+  const char16_t conversion = fmt.back();
   switch (conversion) {
     case u's':
     case u'S':
@@ -58,13 +58,13 @@ bool KindOf(const std::u16string& spec, Kind& kind) {
     default:
       return false;  // floating point and everything unknown
   }
-  if (spec.find(u"I64") != std::u16string::npos || spec.find(u"ll") != std::u16string::npos ||
-      spec.find(u'j') != std::u16string::npos) {
+  if (fmt.find(u"I64") != std::u16string::npos || fmt.find(u"ll") != std::u16string::npos ||
+      fmt.find(u'j') != std::u16string::npos) {
     kind = Kind::Int64;
-  } else if (spec.find(u"I32") != std::u16string::npos) {
+  } else if (fmt.find(u"I32") != std::u16string::npos) {
     kind = Kind::Int32;  // explicitly 32 bits, as the printf engine reads it
-  } else if (spec.find(u'I') != std::u16string::npos || spec.find(u'z') != std::u16string::npos ||
-             spec.find(u't') != std::u16string::npos) {
+  } else if (fmt.find(u'I') != std::u16string::npos || fmt.find(u'z') != std::u16string::npos ||
+             fmt.find(u't') != std::u16string::npos) {
     kind = sizeof(void*) == 8 ? Kind::Int64 : Kind::Int32;
   } else {
     kind = Kind::Int32;
@@ -100,11 +100,11 @@ bool Parse(const std::u16string& text, bool ignoreInserts, DWORD width, std::vec
       size_t start = i - 1;
       int index = next - u'0';
       if (i + 1 < text.size() && text[i + 1] >= u'0' && text[i + 1] <= u'9') index = index * 10 + (text[++i] - u'0');
-      std::u16string spec = u"s";
+      std::u16string fmt = u"s";
       if (i + 1 < text.size() && text[i + 1] == u'!') {
         size_t close = text.find(u'!', i + 2);
         if (close == std::u16string::npos || close == i + 2) return false;
-        spec = text.substr(i + 2, close - i - 2);
+        fmt = text.substr(i + 2, close - i - 2);
         i = close;
       }
       if (ignoreInserts) {
@@ -113,9 +113,9 @@ bool Parse(const std::u16string& text, bool ignoreInserts, DWORD width, std::vec
       }
       Piece piece;
       piece.index = index;
-      piece.spec = spec;
-      for (char16_t s : spec) piece.stars += s == u'*' ? 1 : 0;
-      if (!KindOf(spec, piece.kind) || piece.stars > 2 || index + piece.stars > kMaxInsert) return false;
+      piece.fmt = fmt;
+      for (char16_t s : fmt) piece.stars += s == u'*' ? 1 : 0;
+      if (!KindOf(fmt, piece.kind) || piece.stars > 2 || index + piece.stars > kMaxInsert) return false;
       flush();
       pieces.push_back(std::move(piece));
       continue;
@@ -153,9 +153,9 @@ int FormatInto(char16_t* out, size_t capacity, const char16_t* format, ...) {
   return n;
 }
 
-// Formats one insert with its specification; false when the engine refuses it.
+// Formats one insert with its format; false when the engine refuses it.
 bool FormatInsert(const Piece& piece, const std::vector<Value>& values, std::u16string& out) {
-  const std::u16string format = u"%" + piece.spec;
+  const std::u16string format = u"%" + piece.fmt;
   int star[2] = {0, 0};
   for (int s = 0; s < piece.stars; ++s) star[s] = static_cast<int>(values[piece.index + s]);
   const Value value = values[piece.index + piece.stars];
@@ -258,7 +258,7 @@ DWORD FormatMessageW(DWORD flags, const void* source, DWORD messageId, DWORD lan
     if (!Parse(text, ignoreInserts, width, pieces)) return Fail(ERROR_INVALID_PARAMETER);
 
     // The insert values, fetched in order of their numbers, each with the kind its
-    // specification takes (numbers no insert names are taken as pointer-sized).
+    // format takes (numbers no insert names are taken as pointer-sized).
     int highest = 0;
     for (const Piece& p : pieces) {
       if (p.index != 0 && p.index + p.stars > highest) highest = p.index + p.stars;
