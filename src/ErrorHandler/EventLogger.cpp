@@ -21,6 +21,9 @@ std::atomic<EventLogger*> EventLogger::m_pEventLogger{nullptr};
 
 namespace {
 
+// Where backwards reading goes on after the oldest record: a number no record has.
+constexpr DWORD kPastOldestRecord = 0xFFFFFFFFu;
+
 constexpr size_t kMaxWriteInserts = 16;
 constexpr size_t kMaxReadInserts = 50;
 constexpr size_t kSystemTextSize = 2048;
@@ -617,7 +620,12 @@ void EventLogger::ReadEventLog(int logType, unsigned maxRecords, bool forwards, 
           at += head.Length;
         }
       }
-      if (collected) recordNumber += forwards ? 1 : static_cast<DWORD>(-1);
+      if (collected) {
+        // One record on. Backwards from record 1 there is nothing left; the number 0 would mean
+        // "start at the newest" and send a caller paging backwards round the log for ever, so the
+        // next call is aimed past the oldest record instead and returns nothing.
+        recordNumber = forwards ? recordNumber + 1 : recordNumber > 1 ? recordNumber - 1 : kPastOldestRecord;
+      }
     CHECKPOINT_CATCH
   } catch (EventLogFailure&) {
     throw;

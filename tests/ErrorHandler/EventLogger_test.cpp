@@ -353,6 +353,9 @@ TEST_F(EventLoggerTest, ReadEventLogPagesInBothDirections) {
   logger.ReadEventLog(1, 10, false, records, next);
   ASSERT_EQ(records.size(), 3u);
   EXPECT_TRUE(Contains(records[2], u"line1"));
+  // Paging backwards ends after the oldest record instead of starting again at the newest.
+  logger.ReadEventLog(1, 10, false, records, next);
+  EXPECT_TRUE(records.empty());
 
   // Another log, and a log type that does not exist: no records, no failure.
   next = 0;
