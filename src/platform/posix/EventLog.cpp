@@ -421,36 +421,33 @@ BOOL ReadEventLogW(HANDLE log, DWORD flags, DWORD recordOffset, void* buffer, DW
   return TRUE;
 }
 
-BOOL GetNumberOfEventLogRecords(HANDLE log, DWORD* count) {
+namespace {
+
+// One number about log `log` from the store, by `sql` (the log bound as ?1).
+BOOL QueryLogNumber(HANDLE log, const char* sql, DWORD* value) {
   LogHandle* handle = FindHandle<LogHandle>(log, kLogMagic);
   if (handle == nullptr) return Fail(ERROR_INVALID_HANDLE);
-  if (count == nullptr) return Fail(ERROR_INVALID_PARAMETER);
+  if (value == nullptr) return Fail(ERROR_INVALID_PARAMETER);
   DWORD error = Store().Read([&](StateStore& store) {
-    Statement q(store, "SELECT count(*) FROM event_records WHERE log = ?1");
+    Statement q(store, sql);
     if (q.Prepared() != SQLITE_OK) return store.Error(q.Prepared());
     q.Bind(1, handle->log);
     int rc = q.Step();
     if (rc != SQLITE_ROW) return store.Error(rc);
-    *count = static_cast<DWORD>(q.Int(0));
+    *value = static_cast<DWORD>(q.Int(0));
     return static_cast<DWORD>(ERROR_SUCCESS);
   });
   return error == ERROR_SUCCESS ? TRUE : Fail(error);
 }
 
+}  // namespace
+
+BOOL GetNumberOfEventLogRecords(HANDLE log, DWORD* count) {
+  return QueryLogNumber(log, "SELECT count(*) FROM event_records WHERE log = ?1", count);
+}
+
 BOOL GetOldestEventLogRecord(HANDLE log, DWORD* oldest) {
-  LogHandle* handle = FindHandle<LogHandle>(log, kLogMagic);
-  if (handle == nullptr) return Fail(ERROR_INVALID_HANDLE);
-  if (oldest == nullptr) return Fail(ERROR_INVALID_PARAMETER);
-  DWORD error = Store().Read([&](StateStore& store) {
-    Statement q(store, "SELECT coalesce(min(number), 0) FROM event_records WHERE log = ?1");
-    if (q.Prepared() != SQLITE_OK) return store.Error(q.Prepared());
-    q.Bind(1, handle->log);
-    int rc = q.Step();
-    if (rc != SQLITE_ROW) return store.Error(rc);
-    *oldest = static_cast<DWORD>(q.Int(0));
-    return static_cast<DWORD>(ERROR_SUCCESS);
-  });
-  return error == ERROR_SUCCESS ? TRUE : Fail(error);
+  return QueryLogNumber(log, "SELECT coalesce(min(number), 0) FROM event_records WHERE log = ?1", oldest);
 }
 
 BOOL ClearEventLogW(HANDLE log, const char16_t* backupFile) {

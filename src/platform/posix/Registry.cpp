@@ -169,8 +169,10 @@ std::u16string ValueName(const char16_t* name) { return name == nullptr ? std::u
 
 }  // namespace
 
-LONG RegCreateKeyExW(HKEY key, const char16_t* subKey, DWORD, char16_t*, DWORD, REGSAM access, void*, HKEY* result,
-                     DWORD* disposition) {
+namespace {
+
+// Opens `subKey` below `key` (creating the missing parts when `create`) as a new handle.
+LONG OpenOrCreateKey(HKEY key, const char16_t* subKey, REGSAM access, bool create, HKEY* result, bool& created) {
   if (result == nullptr) return ERROR_INVALID_PARAMETER;
   *result = nullptr;
   KeyRef ref;
@@ -178,35 +180,32 @@ LONG RegCreateKeyExW(HKEY key, const char16_t* subKey, DWORD, char16_t*, DWORD, 
   std::vector<std::u16string> parts;
   if (!SplitPath(subKey, parts)) return ERROR_BAD_PATHNAME;
   std::int64_t id = 0;
-  bool created = false;
-  DWORD error = Store().Write([&](StateStore& store) {
+  auto work = [&](StateStore& store) {
     DWORD e = CheckExists(store, ref);
     if (e != ERROR_SUCCESS) return e;
-    return Walk(store, ref.id, parts, true, ref.access, id, created);
-  });
+    return Walk(store, ref.id, parts, create, ref.access, id, created);
+  };
+  DWORD error = create ? Store().Write(work) : Store().Read(work);
   if (error != ERROR_SUCCESS) return static_cast<LONG>(error);
   *result = NewHandle(id, access);
-  if (disposition != nullptr) *disposition = created ? REG_CREATED_NEW_KEY : REG_OPENED_EXISTING_KEY;
   return ERROR_SUCCESS;
 }
 
-LONG RegOpenKeyExW(HKEY key, const char16_t* subKey, DWORD, REGSAM access, HKEY* result) {
-  if (result == nullptr) return ERROR_INVALID_PARAMETER;
-  *result = nullptr;
-  KeyRef ref;
-  if (!Resolve(key, ref)) return ERROR_INVALID_HANDLE;
-  std::vector<std::u16string> parts;
-  if (!SplitPath(subKey, parts)) return ERROR_BAD_PATHNAME;
-  std::int64_t id = 0;
+}  // namespace
+
+LONG RegCreateKeyExW(HKEY key, const char16_t* subKey, DWORD, char16_t*, DWORD, REGSAM access, void*, HKEY* result,
+                     DWORD* disposition) {
   bool created = false;
-  DWORD error = Store().Read([&](StateStore& store) {
-    DWORD e = CheckExists(store, ref);
-    if (e != ERROR_SUCCESS) return e;
-    return Walk(store, ref.id, parts, false, ref.access, id, created);
-  });
-  if (error != ERROR_SUCCESS) return static_cast<LONG>(error);
-  *result = NewHandle(id, access);
-  return ERROR_SUCCESS;
+  LONG error = OpenOrCreateKey(key, subKey, access, true, result, created);
+  if (error == ERROR_SUCCESS && disposition != nullptr) {
+    *disposition = created ? REG_CREATED_NEW_KEY : REG_OPENED_EXISTING_KEY;
+  }
+  return error;
+}
+
+LONG RegOpenKeyExW(HKEY key, const char16_t* subKey, DWORD, REGSAM access, HKEY* result) {
+  bool created = false;
+  return OpenOrCreateKey(key, subKey, access, false, result, created);
 }
 
 LONG RegQueryValueExW(HKEY key, const char16_t* name, DWORD*, DWORD* type, BYTE* data, DWORD* size) {
